@@ -1,0 +1,24 @@
+# morvane_options: what every target of this project is compiled and linked with.
+add_library(morvane_options INTERFACE)
+
+target_compile_options(morvane_options INTERFACE
+  -Wall -Wextra -Werror
+  -Wconversion -Wsign-conversion -Wshadow -Wold-style-cast -Wcast-qual -Wcast-align
+  -Wformat=2 -Wnon-virtual-dtor -Woverloaded-virtual -Wundef -Wimplicit-fallthrough)
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+  target_compile_options(morvane_options INTERFACE
+    -Wduplicated-cond -Wduplicated-branches -Wlogical-op -Wuseless-cast)
+endif()
+
+if(MORVANE_HARDENED)
+  target_compile_options(morvane_options INTERFACE
+    -fstack-protector-strong -fstack-clash-protection -fcf-protection -U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2
+    -ffile-prefix-map=${CMAKE_SOURCE_DIR}=.)
+  target_link_options(morvane_options INTERFACE -Wl,-z,relro,-z,now,-z,noexecstack,-z,text)
+endif()
+
+if(MORVANE_SANITIZED)
+  target_compile_options(morvane_options INTERFACE
+    -fsanitize=address,undefined -fno-sanitize-recover=all -fno-omit-frame-pointer)
+  target_link_options(morvane_options INTERFACE -fsanitize=address,undefined)
+endif()

@@ -1,0 +1,19 @@
+# HbaApi::HbaApi: the SNIA HBA API library. The header is Debian's libhbaapi-dev for both word sizes. The
+# i386 and amd64 packages of the library own the same file names and cannot be installed side by side, so a
+# 32-bit build links the i386 package that `./dev` unpacked into its build folder, and finds it there again
+# at run time by a path relative to the program.
+find_path(HBAAPI_INCLUDE_DIR hbaapi.h REQUIRED)
+if(CMAKE_SIZEOF_VOID_P EQUAL 4)
+  set(HBAAPI_LIBRARY ${CMAKE_BINARY_DIR}/hbaapi/usr/lib/libHBAAPI.so.2)
+  set(CMAKE_BUILD_RPATH "$ORIGIN/hbaapi/usr/lib")
+  if(NOT EXISTS ${HBAAPI_LIBRARY})
+    message(FATAL_ERROR "No 32-bit libHBAAPI in ${CMAKE_BINARY_DIR}/hbaapi: build with ./dev build i386")
+  endif()
+else()
+  find_library(HBAAPI_LIBRARY HBAAPI REQUIRED)
+endif()
+
+add_library(HbaApi::HbaApi SHARED IMPORTED)
+set_target_properties(HbaApi::HbaApi PROPERTIES
+  IMPORTED_LOCATION ${HBAAPI_LIBRARY}
+  INTERFACE_INCLUDE_DIRECTORIES ${HBAAPI_INCLUDE_DIR})
