@@ -7,7 +7,7 @@ target_compile_options(morvane_options INTERFACE
   -Wformat=2 -Wnon-virtual-dtor -Woverloaded-virtual -Wundef -Wimplicit-fallthrough)
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
   target_compile_options(morvane_options INTERFACE
-    -Wduplicated-cond -Wduplicated-branches -Wlogical-op -Wuseless-cast)
+    -Wduplicated-cond -Wduplicated-branches -Wlogical-op)
 endif()
 
 if(MORVANE_HARDENED)

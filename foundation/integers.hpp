@@ -6,4 +6,5 @@
 using uint8 = std::uint8_t;
 using uint16 = std::uint16_t;
 using uint32 = std::uint32_t;
+using uint64 = std::uint64_t;
 using int32 = std::int32_t;

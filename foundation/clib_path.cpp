@@ -1,0 +1,129 @@
+#include "foundation/clib_path.hpp"
+
+#include <unistd.h>
+#include <utime.h>
+
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <string>
+
+#include "foundation/clib_error.hpp"
+#include "foundation/clib_stream.hpp"
+#include "foundation/exceptions.hpp"
+#include "foundation/trace.hpp"
+
+namespace {
+
+// Drops the environment entry that is `block` itself.
+void removeFromEnvironment(const char* block) {
+    char** entry = environ;
+    while (entry != nullptr && *entry != nullptr && *entry != block) {
+        ++entry;
+    }
+    while (entry != nullptr && *entry != nullptr) {
+        *entry = entry[1];
+        ++entry;
+    }
+}
+
+} // namespace
+
+void Clib_chdir(const char* path) {
+    if (chdir(path) != 0) {
+        throwErrno<ClibChdirFailedEx>();
+    }
+}
+
+void Clib_chmod(const char* path, mode_t mode) {
+    if (chmod(path, mode) != 0) {
+        throwErrno<ClibChmodFailedEx>();
+    }
+}
+
+char* Clib_getcwd(char* buffer, std::size_t size) {
+    char* const result = getcwd(buffer, size);
+    if (result == nullptr) {
+        throwErrno<ClibPwdFailedEx>();
+    }
+    return result;
+}
+
+void Clib_mkdir(const char* path, mode_t mode) {
+    if (mkdir(path, mode) == -1) {
+        if (errno == EEXIST) {
+            throwErrno<ExistsEx>();
+        }
+        throwErrno<ClibMkdirFailedEx>();
+    }
+}
+
+void Clib_rmdir(const char* path) {
+    if (rmdir(path) == -1) {
+        throwErrno<ClibRmdirFailedEx>();
+    }
+}
+
+void Clib_unlink(const char* path) {
+    if (unlink(path) == -1) {
+        throwErrno<ClibUnlinkFailedEx>();
+    }
+}
+
+void Clib_stat(const char* path, struct stat* status) {
+    if (stat(path, status) == -1) {
+        throwErrno<ClibStatFailedEx>();
+    }
+}
+
+void Clib_utime(const char* path) {
+    if (utime(path, nullptr) == -1) {
+        throwErrno<ClibUtimeFailedEx>();
+    }
+}
+
+void Clib_checkProcess(int processId) {
+    char path[sizeof "/proc/-2147483648"];
+    Clib_snprintf(path, sizeof path, "/proc/%d", processId);
+    struct stat status {};
+    if (stat(path, &status) == -1) {
+        throwErrno<ClibGetProcStatusFailedEx>();
+    }
+}
+
+void Clib_setenv(const char* name, const char* value) {
+    std::string text(name);
+    text += "=";
+    text += value;
+    auto* const block = static_cast<char*>(std::calloc(text.size() + 1, 1));
+    if (block == nullptr) {
+        throw NoMemoryEx("No Memory\n");
+    }
+    std::memcpy(block, text.c_str(), text.size());
+    const int result = putenv(block);
+    const int error = errno;
+    // putenv keeps the block itself, and the block is about to go.
+    removeFromEnvironment(block);
+    std::memset(block, 0, text.size() + 1);
+    std::free(block);
+    if (result != 0) {
+        throw ClibPutenvFailedEx(ErrnoText(error).text);
+    }
+}
+
+int Clib_mkstemp(char* templateFile) {
+    ASSERT_OR_EXIT(templateFile != __null);
+    return mkstemp(templateFile);
+}
+
+char* Clib_getenv(const char* name) {
+    return std::getenv(name);
+}
+
+pid_t Clib_getpid() {
+    return getpid();
+}
+
+mode_t Clib_umask(mode_t mask) {
+    return umask(mask);
+}
