@@ -8,3 +8,4 @@ using uint16 = std::uint16_t;
 using uint32 = std::uint32_t;
 using uint64 = std::uint64_t;
 using int32 = std::int32_t;
+using int64 = std::int64_t;
