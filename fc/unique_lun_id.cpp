@@ -1,0 +1,395 @@
+#include "fc/unique_lun_id.hpp"
+
+#include <exception>
+#include <new>
+
+#include "foundation/clib_stream.hpp"
+#include "foundation/trace.hpp"
+#include "main/run_state.hpp"
+#include "scsi/io_handler_linux.hpp"
+#include "scsi/response_bytes.hpp"
+#include "scsi/scsi_exceptions.hpp"
+
+namespace {
+
+constexpr uint32 kTimeOutMs = 10000;
+constexpr uint32 kDirectAttachedRequest = 2;
+
+// The handler and the inquiry that all calls of a run share, made at the first.
+ZebScsiInquiry::Handler& sharedHandler() {
+    static ZebScsiInquiry::Handler sHandler = [] {
+        ZebScsiInquiry::Handler lHandler;
+        lHandler.create(new (std::nothrow) ZebScsiIoHandlerLinux, ZebPST_Individual, ZebPAT_New);
+        return lHandler;
+    }();
+    return sHandler;
+}
+
+ZebScsiInquiry& sharedInquiry() {
+    static ZebCountedPointer<ZebScsiInquiry> sInquiry = [] {
+        ZebCountedPointer<ZebScsiInquiry> lInquiry;
+        lInquiry.create(new (std::nothrow) ZebScsiInquiry, ZebPST_Individual, ZebPAT_New);
+        return lInquiry;
+    }();
+    return *sInquiry;
+}
+
+// A device node that is open, and closed on every path but one that says otherwise.
+class OpenDevice {
+public:
+    // Becomes the owner of `fd`.
+    explicit OpenDevice(int32 fd) : mFd(fd) {}
+    OpenDevice(const OpenDevice&) = delete;
+    OpenDevice& operator=(const OpenDevice&) = delete;
+    ~OpenDevice() { closeQuietly(); }
+
+    int32 fd() const { return mFd; }
+
+    // Throws CloseFailedEx; the node counts as closed then too.
+    void close() {
+        const int32 lFd = mFd;
+        leaveOpen();
+        sharedHandler()->close(lFd);
+    }
+
+    // For paths on which an exception travels that says more than a failure to close.
+    void closeQuietly() noexcept {
+        if (mFd != kClosed) {
+            try {
+                close();
+            } catch (const std::exception&) {
+                return;
+            }
+        }
+    }
+
+    void leaveOpen() { mFd = kClosed; }
+
+private:
+    static constexpr int32 kClosed = -1;
+    int32 mFd;
+};
+
+ZebString withoutTrailingBlanks(const ZebString& text) {
+    const ZebString::size_type lLast = text.find_last_not_of(" ");
+    return lLast == ZebString::npos ? ZebString("") : text.substr(0, lLast + 1);
+}
+
+// The node's path: the device name up to its first ';'.
+ZebString devicePath(const ZebString& deviceName) {
+    const ZebString::size_type lSemicolon = deviceName.find_first_of(';');
+    return lSemicolon == ZebString::npos ? deviceName : deviceName.substr(0, lSemicolon);
+}
+
+bool contains(const ZebString& text, const char* part) {
+    return text.find(part) != ZebString::npos;
+}
+
+// The log line for the standard-INQUIRY failure that is being handled, or null for one that has none.
+const char* stdInquiryFailureLine() {
+    try {
+        throw;
+    } catch (const TimeOutEx&) {
+        return "Time-out in Getting Std Inquiry Data\n";
+    } catch (const NotSupportedEx&) {
+        return "Std Inquiry Data not supported\n";
+    } catch (const ScsiIoctlEx&) {
+        return "SCSI Ioctl Failure for Std Inquiry Data\n";
+    } catch (const ScsiStatusEx&) {
+        return "SCSI Error for Std Inquiry Data\n";
+    } catch (const InvalidEx&) {
+        return "Unexpected Malformed Std Inquiry Data\n";
+    } catch (const NotFoundEx&) {
+        return "Problem parsing Std Inquiry Data\n";
+    } catch (const ExpiredEx&) {
+        return "Device entry in file system is stale.. ignoring it\n";
+    } catch (...) {
+        return nullptr;
+    }
+}
+
+// What the designators of a device's page 83h say.
+struct Designators {
+    ZebString t10{""};
+    ZebString eui64{""};
+    ZebString scsiName{""};
+    ZebString md5{""};
+    ZebString firstSeen{""};
+    bool isFound = false;            // an identifier is chosen
+    bool hasScsiFailure = false;     // the page could not be read at all
+    bool isPageNotSupported = false; // the device does not have it
+};
+
+void store(ZebString& candidate, const ZebString& text, Designators& designators) {
+    candidate = text;
+    if (designators.firstSeen.empty()) {
+        designators.firstSeen = text;
+    }
+}
+
+// Walks the page's designators to its first NAA one. Throws NotFoundEx behind the last.
+void walkDesignators(const ZebScsiInquiry::Response& page, Designators& designators, ZebString& identifier) {
+    // SPC, designation descriptor: designator types, and association 0 for the logical unit itself.
+    enum DesignatorType : uint32 { kT10VendorId = 1, kEui64 = 2, kNaa = 3, kMd5 = 7, kScsiName = 8 };
+    constexpr uint32 kFirstReservedType = 10;
+    constexpr uint32 kLogicalUnit = 0;
+    uint32 lOffset = 0;
+    while (!designators.isFound) {
+        uint32 lType = 0;
+        uint32 lAssociation = 0;
+        ZebString lRawText("");
+        sharedInquiry().getDiPageIdentifierAscii(page, lOffset, lType, lAssociation, lRawText);
+        if (lAssociation != kLogicalUnit || lType >= kFirstReservedType) {
+            continue;
+        }
+        const ZebString lText = withoutTrailingBlanks(lRawText);
+        switch (lType) {
+        case kT10VendorId:
+            store(designators.t10, lText, designators);
+            logPrintf("Found T10 Id: %s \n", lText.c_str());
+            break;
+        case kEui64:
+            store(designators.eui64, lText, designators);
+            logPrintf("Found Eui64Id: %s \n", lText.c_str());
+            break;
+        case kNaa:
+            store(identifier, lText, designators);
+            designators.isFound = true;
+            logPrintf("Found NaaId: %s \n", lText.c_str());
+            break;
+        case kMd5:
+            store(designators.md5, lText, designators);
+            logPrintf("Found MD5ID: %s \n", lText.c_str());
+            break;
+        case kScsiName:
+            store(designators.scsiName, lText, designators);
+            logPrintf("Found ScsiName ID: %s \n", lText.c_str());
+            break;
+        default:
+            logPrintf("Default ID recieved");
+            break;
+        }
+    }
+}
+
+// Reads page 83h into `page` and takes its designators. No failure of the page leaves this function.
+void readDesignators(int32 fd, ZebScsiInquiry::Response& page, Designators& designators,
+                     ZebString& identifier) {
+    try {
+        sharedInquiry().getDeviceIdentificationVpd(fd, sharedHandler(), kTimeOutMs, page);
+        // Which object holds the page: its bytes stand in the dumps above.
+        logPrintf("Vpd Page: %p\n", static_cast<const void*>(page.get()));
+        walkDesignators(page, designators, identifier);
+    } catch (const NotFoundEx&) {
+        logPrintf("No LUN-association Descriptor found\n");
+    } catch (const InvalidEx&) {
+        logPrintf("Malformed VPD 0x83 Page\n");
+    } catch (const ScsiStatusEx&) {
+        logPrintf("SCSI Error for VPD 0x83 Inquiry\n");
+        designators.hasScsiFailure = true;
+    } catch (const ScsiIoctlEx&) {
+        logPrintf("SCSI Ioctl Failure for VPD 0x83 Page\n");
+        designators.hasScsiFailure = true;
+    } catch (const NotSupportedEx&) {
+        logPrintf("VPD Page 0x83 not supported\n");
+        designators.isPageNotSupported = true;
+    } catch (const TimeOutEx&) {
+        logPrintf("Time-out in Reading VPD 0x83 Page\n");
+        designators.hasScsiFailure = true;
+    }
+}
+
+// Without NAA designator: the first non-empty candidate in the order of preference.
+void choosePreferred(Designators& designators, ZebString& identifier) {
+    if (designators.isFound || designators.firstSeen.empty()) {
+        return;
+    }
+    for (const ZebString* lCandidate :
+         {&designators.t10, &designators.eui64, &designators.scsiName, &designators.md5}) {
+        if (!lCandidate->empty()) {
+            identifier = *lCandidate;
+            break;
+        }
+    }
+    designators.isFound = true;
+}
+
+// Whether the device is one that has an identifier: a disk or array controller, or one of the DAS tree that
+// cannot even be asked.
+bool isDeviceAccepted(const OpenDevice& device, uint32 requestFlag, ZebScsiInquiry::Response& response) {
+    try {
+        return sharedInquiry().isDeviceTypeSupported(device.fd(), sharedHandler(), kTimeOutMs, response);
+    } catch (const std::exception& exception) {
+        logPrintf("Caught exception -> %s : Adding host name as LUN ID if the device is DAS and rejecting "
+                  "otherwise...\n",
+                  exception.what());
+        return requestFlag == kDirectAttachedRequest;
+    }
+}
+
+// The 16 bytes behind the header of page 83h, where old arrays put their identifier without a descriptor, in
+// hex. Bytes that the device did not send are zeros, all of them when there was no page.
+ZebString rawPageIdentifier(const ZebScsiInquiry::Response& page) {
+    constexpr uint32 kHeaderLength = 4;
+    constexpr uint32 kIdentifierLength = 16;
+    if (page != nullptr) {
+        return hexText(ResponseBytes(*page), kHeaderLength, kIdentifierLength);
+    }
+    return {"00000000000000000000000000000000"};
+}
+
+// Makes an identifier of standard INQUIRY data. Throws as the inquiry, and ExpiredEx.
+ZebString identifierFromStdInquiry(int32 fd, const Designators& designators,
+                                   const ZebScsiInquiry::Response& page,
+                                   ZebScsiInquiry::Response& stdResponse) {
+    ZebScsiInquiry& lInquiry = sharedInquiry();
+    lInquiry.doStandardInquiry(fd, sharedHandler(), kTimeOutMs, stdResponse);
+    ZebString lVendor("");
+    sGetStdInqField(lInquiry, stdResponse, VendorId, lVendor);
+    logPrintf("InqBuffer %p Vendor %s \n", static_cast<const void*>(stdResponse.get()), lVendor.c_str());
+    if (lVendor == "NETAPP" && designators.isPageNotSupported) {
+        throw ExpiredEx("Netapp device has expired\n");
+    }
+    if (lVendor == "EMC") {
+        return rawPageIdentifier(page);
+    }
+    ZebString lIdentifier(lVendor);
+    for (const uint32 lField : {ProductId, ProductRevision, UndocumentedId}) {
+        ZebString lText("");
+        sGetStdInqField(lInquiry, stdResponse, lField, lText);
+        lIdentifier += ":";
+        lIdentifier += lText;
+    }
+    return lIdentifier;
+}
+
+// Opens the node for one of the two functions below, whose trace name is `caller`. Throws NotFoundEx.
+int32 openForInquiry(const ZebString& path, const char* caller) {
+    int32 lFd = -1;
+    try {
+        sharedHandler()->open(path, lFd);
+    } catch (const OpenFailedEx& exception) {
+        logPrintf("Cannot do Scsi Inquiry on %s - %s\n", path.c_str(), exception.what());
+        TRACE_EXIT(caller);
+        throw NotFoundEx("Cannot open device for Scsi Inquiry\n");
+    }
+    return lFd;
+}
+
+// Logs the standard-INQUIRY failure that is being handled, closes the device and leaves `caller`, which
+// throws the failure on. An expired device stays open.
+void leaveAfterStdInquiryFailure(OpenDevice& device, const char* caller) {
+    const char* const lLine = stdInquiryFailureLine();
+    if (lLine != nullptr) {
+        logPrintf("%s", lLine);
+        device.closeQuietly();
+        TRACE_EXIT(caller);
+    }
+}
+
+} // namespace
+
+void sGetStdInqField(ZebScsiInquiry& inquiry, const ZebScsiInquiry::Response& response, uint32 fieldIndex,
+                     ZebString& fieldOut) {
+    TRACE_ENTRY("sGetStdInqField");
+    ZebString lText("");
+    inquiry.getInquiryFieldAscii(response, fieldIndex, lText);
+    fieldOut = withoutTrailingBlanks(lText);
+    TRACE_EXIT("sGetStdInqField");
+}
+
+void HA_GetScsiUniqueLunId(const ZebString& deviceName, ZebString& identifier, uint32& requestFlag) {
+    TRACE_ENTRY("HA_GetScsiUniqueLunId");
+    const ZebString lPath = devicePath(deviceName);
+    if (contains(lPath, "/sg")) {
+        TRACE_EXIT("HA_GetScsiUniqueLunId");
+        throw NotSupportedEx("The /sg? device is not supported");
+    }
+    OpenDevice lDevice(openForInquiry(lPath, "HA_GetScsiUniqueLunId"));
+
+    ZebScsiInquiry::Response lPage;
+    ZebScsiInquiry::Response lStdResponse;
+    if (!isDeviceAccepted(lDevice, requestFlag, lStdResponse)) {
+        try {
+            lDevice.close();
+        } catch (const CloseFailedEx&) {
+            logPrintf("Failed to close device handle opened for scsi inquiry");
+        }
+        TRACE_EXIT("HA_GetScsiUniqueLunId");
+        throw NotSupportedEx("Device type not supported");
+    }
+
+    logPrintf("Get LunID\n");
+    Designators lDesignators;
+    readDesignators(lDevice.fd(), lPage, lDesignators, identifier);
+    choosePreferred(lDesignators, identifier);
+    if (lDesignators.isFound) {
+        logPrintf("Old Unique LunId = %s, New Unique LunId = %s\n", lDesignators.firstSeen.c_str(),
+                  identifier.c_str());
+    } else {
+        logPrintf("Could not find UniqueLunId from VPD Page 83, for device %s\n", deviceName.c_str());
+    }
+    if (!lDesignators.isFound && requestFlag == kDirectAttachedRequest) {
+        gDirectAttachedFlag = true;
+        identifier = "";
+        lDesignators.isFound = true;
+    }
+    if (!lDesignators.isFound && lDesignators.hasScsiFailure) {
+        lDevice.close();
+        logPrintf("Can't get ULID using Scsi\n");
+        TRACE_EXIT("HA_GetScsiUniqueLunId");
+        throw NotFoundEx("Can't get ULID using SCSI\n");
+    }
+    if (lDesignators.isFound) {
+        lDevice.close();
+        logPrintf("Got ULID\n");
+        TRACE_EXIT("HA_GetScsiUniqueLunId");
+        return;
+    }
+
+    try {
+        identifier = identifierFromStdInquiry(lDevice.fd(), lDesignators, lPage, lStdResponse);
+    } catch (const ExpiredEx&) {
+        lDevice.leaveOpen();
+        leaveAfterStdInquiryFailure(lDevice, "HA_GetScsiUniqueLunId");
+        throw;
+    } catch (const TException&) {
+        leaveAfterStdInquiryFailure(lDevice, "HA_GetScsiUniqueLunId");
+        throw;
+    }
+    logPrintf("UniqueLunId from Standard Inquiry = %s\n", identifier.c_str());
+    lDevice.close();
+    TRACE_EXIT("HA_GetScsiUniqueLunId");
+}
+
+void HA_PrintVendorProductId(const ZebString& deviceName) {
+    TRACE_ENTRY("HA_PrintVendorProductId");
+    const ZebString lPath = devicePath(deviceName);
+    if (contains(lPath, "/sg")) {
+        TRACE_EXIT("HA_PrintVendorProductId");
+        throw NotSupportedEx("The /sg? device is not supported");
+    }
+    if (contains(lPath, "/dev/hdiskpower")) {
+        TRACE_EXIT("HA_PrintVendorProductId");
+        throw NotSupportedEx("The EMC PowerPath /dev/hdiskpower device is not supported");
+    }
+    OpenDevice lDevice(openForInquiry(lPath, "HA_PrintVendorProductId"));
+    try {
+        ZebScsiInquiry& lInquiry = sharedInquiry();
+        ZebScsiInquiry::Response lResponse;
+        lInquiry.doStandardInquiry(lDevice.fd(), sharedHandler(), kTimeOutMs, lResponse);
+        ZebString lVendor("");
+        ZebString lProduct("");
+        ZebString lRevision("");
+        sGetStdInqField(lInquiry, lResponse, VendorId, lVendor);
+        sGetStdInqField(lInquiry, lResponse, ProductId, lProduct);
+        sGetStdInqField(lInquiry, lResponse, ProductRevision, lRevision);
+        logPrintf("Vendor %s ProductId %s ProductRev %s\n", lVendor.c_str(), lProduct.c_str(),
+                  lRevision.c_str());
+    } catch (const TException&) {
+        leaveAfterStdInquiryFailure(lDevice, "HA_PrintVendorProductId");
+        throw;
+    }
+    lDevice.close();
+    TRACE_EXIT("HA_PrintVendorProductId");
+}
