@@ -1,0 +1,61 @@
+#include "main/device_register.hpp"
+
+#include "foundation/clib_memory.hpp"
+#include "foundation/clib_stream.hpp"
+#include "foundation/trace.hpp"
+
+ZebTwoLevelMap<uint32>::Map DevMap;
+
+uint32 EmulexHash(const char* name) {
+    constexpr uint32 kSeed = 9000;
+    constexpr uint32 m = 0x5BE1D995;
+
+    std::size_t left = Clib_strlen(name);
+    uint32 h = static_cast<uint32>(left) ^ kSeed;
+    const auto* byte = reinterpret_cast<const uint8*>(name);
+    for (; left >= 4; left -= 4, byte += 4) {
+        uint32 k = byte[0] | static_cast<uint32>(byte[1]) << 8 | static_cast<uint32>(byte[2]) << 16 |
+                   static_cast<uint32>(byte[3]) << 24;
+        k *= m;
+        k ^= k >> 24;
+        k *= m;
+        h *= m;
+        h ^= k;
+    }
+    switch (left) {
+    case 3:
+        h ^= static_cast<uint32>(byte[2]) << 16;
+        [[fallthrough]];
+    case 2:
+        h ^= static_cast<uint32>(byte[1]) << 8;
+        [[fallthrough]];
+    case 1:
+        h ^= byte[0];
+        h *= m;
+        break;
+    default:
+        break;
+    }
+    h ^= h >> 13;
+    h *= m;
+    h ^= h >> 15;
+    return h;
+}
+
+void addDeviceNameMap(uint32 type, const ZebString& name) {
+    TRACE_ENTRY("addDeviceNameMap");
+    const uint32 hash = EmulexHash(name.c_str());
+    ZebTwoLevelMap<uint32>::insert(DevMap, hash, name, type);
+    Clib_fprintf(gLogStream, "Added to DevMap %u --> %s --> %x\n", hash, name.c_str(), type);
+    TRACE_EXIT("addDeviceNameMap");
+}
+
+uint32 getDeviceType(const ZebString& name) {
+    TRACE_ENTRY("getDeviceType");
+    const uint32 hash = EmulexHash(name.c_str());
+    if (ZebTwoLevelMap<uint32>::contains(DevMap, hash, name)) {
+        return ZebTwoLevelMap<uint32>::lookup(DevMap, hash, name);
+    }
+    TRACE_EXIT("getDeviceType");
+    return 0;
+}

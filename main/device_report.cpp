@@ -1,0 +1,106 @@
+#include "main/device_report.hpp"
+
+#include <exception>
+
+#include "fc/unique_lun_id.hpp"
+#include "foundation/clib_memory.hpp"
+#include "foundation/clib_stream.hpp"
+#include "foundation/trace.hpp"
+#include "host/reconfirm_das.hpp"
+#include "main/device_register.hpp"
+#include "main/iscsi_model.hpp"
+#include "main/run_state.hpp"
+
+namespace {
+
+// "/dev/" and a kernel name, cut to 63 characters.
+struct DevicePath {
+    explicit DevicePath(const char* name) { Clib_snprintf(text, sizeof text, "/dev/%s", name); }
+    char text[64] = {};
+};
+
+ZebString hostNameAnd(const char* separator, const char* devName) {
+    ZebString lunId(gHostName);
+    lunId += separator;
+    lunId += devName;
+    return lunId;
+}
+
+void printIscsiPath(const IscsiInitiatorPort& port, const IscsiLunPath& path) {
+    Clib_fprintf(gLogStream, "|_ Initiator IQN ");
+    Clib_fprintf(gLogStream, " %s\n", port.init_wwnn.c_str());
+    Clib_fprintf(gLogStream, "|  |_ Target IQN");
+    Clib_fprintf(gLogStream, " %s\n", path.tgt_wwnn.c_str());
+    Clib_fprintf(gLogStream, "|  |  |_ Initiator_IP/MAC <--------> Target_IP\n");
+    Clib_fprintf(gLogStream, "         %s <---> %s\n", port.init_wwpn.c_str(), path.tgt_wwpn.c_str());
+    Clib_fprintf(gLogStream, "|  |  |  |_ Device_Name: %s sScsiOSLun: %d LunId: %s\n\n", path.deviceName,
+                 path.sScsiOSLun, path.uniqueLunId.c_str());
+}
+
+void printIscsiTree() {
+    for (const ZebCountedPointer<IscsiInitiatorPort>& port : gIscsiPortList) {
+        if (port->paths.empty()) {
+            logPrintf("No target mappings for port");
+            continue;
+        }
+        Clib_fprintf(gLogStream, "\n");
+        for (const ZebCountedPointer<IscsiLunPath>& path : port->paths) {
+            printIscsiPath(*port, *path);
+        }
+    }
+}
+
+void printDasDevice(char* name) {
+    ZebString lunId("");
+    char* const bang = std::strchr(name, '!'); // the kernel's stand-in for the '/' of cciss/c0d0
+    if (bang != nullptr) {
+        *bang = '/';
+    }
+    const DevicePath devName(name);
+    if (getDeviceType(devName.text) != 0 || reconfirmDAS(devName.text) == 0) {
+        return;
+    }
+    uint32 requestFlag = TREE_DAS;
+    try {
+        HA_GetScsiUniqueLunId(devName.text, lunId, requestFlag);
+    } catch (const std::exception&) {
+        Clib_fprintf(gLogStream, "Exception occured while getting LUN ID for device %s\n", devName.text);
+        if (!gDirectAttachedFlag) {
+            Clib_fprintf(gLogStream, "\n--------> Device Name: |%s| is not supported\n\n", devName.text);
+            return;
+        }
+    }
+    if (gDirectAttachedFlag) {
+        lunId = hostNameAnd("::", devName.text);
+        gDirectAttachedFlag = false;
+    }
+    addDeviceNameMap(TREE_DAS, devName.text);
+    Clib_fprintf(gLogStream, "\n--------> Device Name: |%s| LunId: |%s|\n\n", devName.text, lunId.c_str());
+}
+
+void printLogicalDevice(const char* name) {
+    const DevicePath devName(name);
+    if (getDeviceType(devName.text) == 0) {
+        const ZebString lunId = hostNameAnd(" :: ", devName.text);
+        Clib_fprintf(gLogStream, "\n--------> Device Name: |%s| LunId: |%s| \n", devName.text, lunId.c_str());
+    }
+}
+
+} // namespace
+
+void printDeviceTree(int32 type, char* name) {
+    TRACE_ENTRY("printDeviceTree");
+    switch (type) {
+    case TREE_ISCSI:
+        printIscsiTree();
+        break;
+    case TREE_DAS:
+        printDasDevice(name);
+        break;
+    case TREE_LOGICAL:
+        printLogicalDevice(name);
+        break;
+    default:
+        break;
+    }
+}
