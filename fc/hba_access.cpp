@@ -40,7 +40,7 @@ MappingBlock<HBA_FCPTARGETMAPPING> withinBlock(MappingBlock<HBA_FCPTARGETMAPPING
 
 } // namespace
 
-PortAttributes::PortAttributes(uint32 count) : mCount(count), mpRecords(nullptr) {
+PortAttributes::PortAttributes(uint32 count) : mCount(count) {
     // Pointers count as the 32-bit program's, for the same line between possible and not in both builds.
     constexpr uint32 kMostPointers = 0x7FFFFFFF / 4;
     if (count <= kMostPointers) {

@@ -31,7 +31,7 @@ public:
 
 private:
     uint32 mCount;
-    HBA_PORTATTRIBUTES** mpRecords;
+    HBA_PORTATTRIBUTES** mpRecords = nullptr;
 };
 
 // A target mapping of either layout: one zeroed malloc block, an entry count and then the entries.

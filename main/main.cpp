@@ -103,9 +103,9 @@ int main() {
         return EXIT_SUCCESS;
     } catch (const std::exception& exception) {
         // Nothing stands between this failure and the end of the program; exit flushes the log so far.
-        std::fputs(exception.what(), stderr);
+        static_cast<void>(std::fputs(exception.what(), stderr));
     } catch (...) {
-        std::fputs("unknown exception\n", stderr);
+        static_cast<void>(std::fputs("unknown exception\n", stderr));
     }
     return EXIT_FAILURE;
 }

@@ -95,6 +95,7 @@ const ZebString& ZebSensorLinuxPowerPathHandler::getPseudoDevice(const ZebString
 void ZebSensorLinuxPowerPathHandler::sExecuteCommand(const char* command, LineList::List& lines) {
     TRACE_ENTRY("sExecuteCommand");
     logPrintf("Calling popen\n");
+    // NOLINTNEXTLINE(cert-env33-c): the commands are fixed
     std::unique_ptr<std::FILE, decltype(&pclose)> output(popen(command, "r"), &pclose);
     if (!output) {
         logPrintf("Failed in popen\n");
@@ -158,7 +159,8 @@ void ZebSensorLinuxPowerPathHandler::__parse(LineList::List& arOutput) {
         ZebString pseudoName("");
         sParseOutputLine(arOutput, pseudoName);
         logPrintf("pseudo device - %s\n", pseudoName.c_str());
-        ASSERT_OR_EXIT(0 != arOutput.size());
+        ASSERT_OR_EXIT(0 !=
+                       arOutput.size()); // NOLINT(readability-container-size-empty): the log shows this text
         ZebString ulid("");
         sParseOutputLine(arOutput, ulid);
         logPrintf("ulid - %s\n", ulid.c_str());
@@ -177,7 +179,7 @@ void ZebSensorLinuxPowerPathHandler::__parse(LineList::List& arOutput) {
 
 void ZebSensorLinuxPowerPathHandler::sParseOutputLine(LineList::List& arOutput, ZebString& valueOut) {
     TRACE_ENTRY("sParseOutputLine");
-    ASSERT_OR_EXIT(0 != arOutput.size());
+    ASSERT_OR_EXIT(0 != arOutput.size()); // NOLINT(readability-container-size-empty): the log shows this text
     const ZebString line = LineList::front(arOutput);
     LineList::pop_front(arOutput);
     const ZebString::size_type lPos = line.find_first_of('=');

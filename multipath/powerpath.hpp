@@ -43,8 +43,8 @@ public:
     static char* sBreakOutput(char* buffer, LineList::List& lines);
 
     // Takes the listing's lines two by two: a pseudo device, then its logical unit's identifier.
-    void
-    __parse(LineList::List& arOutput); // NOLINT(bugprone-reserved-identifier): the name that the trace shows
+    // NOLINTNEXTLINE(bugprone-reserved-identifier,cert-dcl37-c,cert-dcl51-cpp): the name that the trace shows
+    void __parse(LineList::List& arOutput);
 
     // Takes the front line; its text behind the first "=" is the value. Fatal when there is none of either.
     static void sParseOutputLine(LineList::List& arOutput, ZebString& valueOut);

@@ -268,8 +268,9 @@ void ZebScsiInquiry::getDeviceIdentificationVpd(int32 fd, const Handler& handler
     const Response& lcDiPage = responseOut;
     const ResponseBytes lPage(*lcDiPage);
     dumpBytes(lPage, 0, lAllocLength);
-    // clang-format off: the blanks show in the text
-    ASSERT_OR_EXIT(__null != static_cast<const uint8*>(*lcDiPage));
+    // The blanks show in the assertion's text.
+    // clang-format off
+    ASSERT_OR_EXIT(__null != static_cast<const uint8 *> (*lcDiPage));
     // clang-format on
     logPrintf("Peripheral type from vpd page = %u\n", lPage[0] & 0x1FU);
     TRACE_EXIT("getDeviceIdentificationVpd");
