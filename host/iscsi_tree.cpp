@@ -28,13 +28,22 @@ constexpr int32 kNoLun = -1;
 
 // What the listing has said so far of the current session; values outlive the session unless a line of the
 // next one replaces or empties them.
-ZebString gTargetIqn("");
-ZebString gTargetIp("");
-ZebString gInitiatorIqn("");
-ZebString gInitiatorIp("");
-ZebString gInitiatorMac("");
-bool gInDeviceList = false;
-int32 gCurrentLun = kNoLun;
+struct SessionState {
+    ZebString gTargetIqn{""};
+    ZebString gTargetIp{""}; // the portal's address, without port
+    ZebString gInitiatorIqn{""};
+    ZebString gInitiatorIp{""};
+    ZebString gInitiatorMac{""};
+    bool gInDeviceList = false;
+    int32 gCurrentLun = kNoLun;
+};
+
+// The run's one state, made at its first use: memory that runs out ends the tree there, not the program
+// before its start.
+SessionState& session() {
+    static SessionState sState;
+    return sState;
+}
 
 // Lines of any length, one at a time, in memory that grows with the longest.
 class LineBuffer {
@@ -84,9 +93,10 @@ int32 parseLun(const char* text) {
 }
 
 ZebString initiatorPort() {
-    const ZebString& port = isMissing(gInitiatorIp) ? gInitiatorMac : gInitiatorIp;
+    const ZebString& port =
+        isMissing(session().gInitiatorIp) ? session().gInitiatorMac : session().gInitiatorIp;
     if (port == "0.0.0.0" || isMissing(port)) {
-        ZebString portOfIqn(gInitiatorIqn);
+        ZebString portOfIqn(session().gInitiatorIqn);
         portOfIqn += ":0";
         return portOfIqn;
     }
@@ -101,7 +111,7 @@ ZebCountedPointer<IscsiInitiatorPort> findOrAddPort(const ZebString& port) {
     }
     ZebCountedPointer<IscsiInitiatorPort> added;
     added.create(new (std::nothrow) IscsiInitiatorPort, ZebPST_Individual, ZebPAT_New);
-    added->init_wwnn = gInitiatorIqn;
+    added->init_wwnn = session().gInitiatorIqn;
     added->init_wwpn = port;
     ZebList<ZebCountedPointer<IscsiInitiatorPort>>::push_back(gIscsiPortList, added);
     PortMap::insert(gIscsiPortMap, port, added);
@@ -112,11 +122,11 @@ void addPath(const ZebString& port, const ZebString& lunId, const ZebString& dev
     ZebCountedPointer<IscsiInitiatorPort> portRecord = findOrAddPort(port);
     ZebCountedPointer<IscsiLunPath> path;
     path.create(new (std::nothrow) IscsiLunPath, ZebPST_Individual, ZebPAT_New);
-    path->tgt_wwnn = gTargetIqn;
-    path->tgt_wwpn = gTargetIp;
+    path->tgt_wwnn = session().gTargetIqn;
+    path->tgt_wwpn = session().gTargetIp;
     path->uniqueLunId = lunId;
     Clib_strncpy(path->deviceName, devName.c_str(), sizeof path->deviceName - 1);
-    path->sScsiOSLun = gCurrentLun;
+    path->sScsiOSLun = session().gCurrentLun;
     ZebList<ZebCountedPointer<IscsiLunPath>>::push_back(portRecord->paths, path);
 }
 
@@ -144,9 +154,10 @@ void addIscsiPath(const ZebString& devName) {
     }
     Clib_fprintf(gLogStream,
                  "Register new iSCSI path: init_wwnn=%s, init_wwpn=%s, tgt_wwnn=%s, tgt_wwpn=%s, lun=%d\n",
-                 gInitiatorIqn.c_str(), port.c_str(), gTargetIqn.c_str(), gTargetIp.c_str(), gCurrentLun);
-    if (isMissing(gInitiatorIqn) || isMissing(port) || isMissing(gTargetIqn) || isMissing(gTargetIp) ||
-        gCurrentLun < 0) {
+                 session().gInitiatorIqn.c_str(), port.c_str(), session().gTargetIqn.c_str(),
+                 session().gTargetIp.c_str(), session().gCurrentLun);
+    if (isMissing(session().gInitiatorIqn) || isMissing(port) || isMissing(session().gTargetIqn) ||
+        isMissing(session().gTargetIp) || session().gCurrentLun < 0) {
         Clib_fprintf(gLogStream, "Ignoring device %s, some param missing!\n", devName.c_str());
     } else {
         addPath(port, lunId, devName);
@@ -165,49 +176,49 @@ void processCmdOutput(char* line) {
     switch (p[0]) {
     case 'T':
         if (isKey("Target:")) {
-            gTargetIqn = valueAfter("Target:");
-            gTargetIp = "";
-            gInitiatorIp = "";
-            gInitiatorMac = "";
-            gCurrentLun = kNoLun;
-            logPrintf("Target IQN '%s'\n", gTargetIqn.c_str());
+            session().gTargetIqn = valueAfter("Target:");
+            session().gTargetIp = "";
+            session().gInitiatorIp = "";
+            session().gInitiatorMac = "";
+            session().gCurrentLun = kNoLun;
+            logPrintf("Target IQN '%s'\n", session().gTargetIqn.c_str());
         }
         break;
     case 'C':
         if (isKey("Current Portal:")) {
-            gTargetIp = cutAtColon(valueAfter("Current Portal:"));
-            gInDeviceList = false;
-            gInitiatorIp = "";
-            gInitiatorMac = "";
-            gCurrentLun = kNoLun;
-            logPrintf("Target IP '%s'\n", gTargetIp.c_str());
+            session().gTargetIp = cutAtColon(valueAfter("Current Portal:"));
+            session().gInDeviceList = false;
+            session().gInitiatorIp = "";
+            session().gInitiatorMac = "";
+            session().gCurrentLun = kNoLun;
+            logPrintf("Target IP '%s'\n", session().gTargetIp.c_str());
         }
         break;
     case 'I':
         if (isKey("Iface HWaddress:")) {
-            gInitiatorMac = valueAfter("Iface HWaddress:");
-            logPrintf("Initiator MAC '%s'\n", gInitiatorMac.c_str());
+            session().gInitiatorMac = valueAfter("Iface HWaddress:");
+            logPrintf("Initiator MAC '%s'\n", session().gInitiatorMac.c_str());
         } else if (isKey("Iface IPaddress:")) {
-            gInitiatorIp = cutAtColon(valueAfter("Iface IPaddress:"));
-            logPrintf("Initiator IP '%s'\n", gInitiatorIp.c_str());
+            session().gInitiatorIp = cutAtColon(valueAfter("Iface IPaddress:"));
+            logPrintf("Initiator IP '%s'\n", session().gInitiatorIp.c_str());
         }
         break;
     case 'A':
-        if (!gInDeviceList && isKey("Attached SCSI devices:")) {
-            gInDeviceList = true;
+        if (!session().gInDeviceList && isKey("Attached SCSI devices:")) {
+            session().gInDeviceList = true;
             logPrintf("Got device list start\n");
-        } else if (gInDeviceList && beginsWith(p, "Attached scsi disk")) {
+        } else if (session().gInDeviceList && beginsWith(p, "Attached scsi disk")) {
             char devName[128] = {};
             Clib_snprintf(devName, sizeof devName, "/dev/%s", valueAfter("Attached scsi disk"));
             addIscsiPath(devName);
-            gCurrentLun = kNoLun; // the next disk's own line names its LUN
+            session().gCurrentLun = kNoLun; // the next disk's own line names its LUN
             logPrintf("Disk name '%s'\n", devName);
         }
         break;
     case 's':
-        if (char* const lun = gInDeviceList ? std::strstr(p, "Lun:") : nullptr) {
+        if (char* const lun = session().gInDeviceList ? std::strstr(p, "Lun:") : nullptr) {
             const char* const value = cutToken(skipBlanks(lun + sizeof "Lun:" - 1));
-            gCurrentLun = parseLun(value);
+            session().gCurrentLun = parseLun(value);
             logPrintf("LUN '%s'\n", value);
         }
         break;
@@ -222,7 +233,7 @@ uint32 readInitiatorIQN() {
     std::FILE* const file = std::fopen(kInitiatorNameFile, "r");
     if (file == nullptr) {
         Clib_fprintf(gLogStream, "Failed to open /etc/iscsi/initiatorname.iscsi!\n");
-        gInitiatorIqn = gHostName;
+        session().gInitiatorIqn = gHostName;
         return kNoInitiatorFile;
     }
     while (char* const line = gLineBuffer.next(file)) {
@@ -230,14 +241,14 @@ uint32 readInitiatorIQN() {
         if (beginsWith(key, kInitiatorNameKey)) {
             const char* const value = cutToken(key + sizeof kInitiatorNameKey - 1);
             Clib_fprintf(gLogStream, "InitiatorIQN %s\n", value);
-            gInitiatorIqn = value;
+            session().gInitiatorIqn = value;
             break;
         }
     }
     static_cast<void>(std::fclose(file)); // only read
-    if (gInitiatorIqn.empty()) {
+    if (session().gInitiatorIqn.empty()) {
         logPrintf("Failed to find the Initiator IQN, using hostname!\n");
-        gInitiatorIqn = gHostName;
+        session().gInitiatorIqn = gHostName;
     }
     TRACE_EXIT("readInitiatorIQN");
     return kInitiatorRead;
