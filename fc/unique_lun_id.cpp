@@ -374,9 +374,9 @@ void HA_PrintVendorProductId(const ZebString& deviceName) {
         throw NotSupportedEx("The EMC PowerPath /dev/hdiskpower device is not supported");
     }
     OpenDevice lDevice(openForInquiry(lPath, "HA_PrintVendorProductId"));
+    ZebScsiInquiry::Response lResponse; // lives until the trace has left the function
     try {
         ZebScsiInquiry& lInquiry = sharedInquiry();
-        ZebScsiInquiry::Response lResponse;
         lInquiry.doStandardInquiry(lDevice.fd(), sharedHandler(), kTimeOutMs, lResponse);
         ZebString lVendor("");
         ZebString lProduct("");
