@@ -18,7 +18,7 @@ private:
     std::string mMessage;
 };
 
-// clang-format off: a table
+// clang-format off
 
 // Memory, elements and arguments.
 struct NoMemoryEx : TException {
