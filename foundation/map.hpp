@@ -54,7 +54,15 @@ struct ZebTwoLevelMap {
     // when memory runs out.
     static void insert(Map& map, uint32 outerKey, const ZebString& innerKey, const Value& value) {
         try {
-            map[outerKey].insert(std::make_pair(innerKey, value));
+            const auto outer = map.find(outerKey);
+            if (outer != map.end()) {
+                outer->second.insert(std::make_pair(innerKey, value));
+                return;
+            }
+            // Filled before it goes in: no outer key may be left behind without an entry.
+            std::map<ZebString, Value> inner;
+            inner.insert(std::make_pair(innerKey, value));
+            map.emplace(outerKey, std::move(inner));
         } catch (const std::bad_alloc&) {
             throw ZebNotFoundEx("No Memory");
         }
