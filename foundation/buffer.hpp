@@ -55,9 +55,11 @@ public:
     // a NUL. Throws WriteFailedEx "String Write failed\n".
     void writeAscii(char* acpOutput) const;
 
-private:
+    // Frees an owned block or lets go of the wrapped memory, and leaves the buffer empty: every access is
+    // fatal from then on. The destructor's work.
     void _destroy() noexcept; // NOLINT(bugprone-reserved-identifier): the name that the trace shows
 
+private:
     uint8* mpPointer = nullptr;
     const uint8* mcpPointer = nullptr;
     uint32 mUseLength = 0;
