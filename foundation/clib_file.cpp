@@ -24,10 +24,12 @@ int Clib_creat(const char* path, mode_t mode) {
     return fd;
 }
 
-void Clib_close(int fd) {
-    if (close(fd) != 0) {
+int Clib_close(int fd) {
+    const int result = close(fd);
+    if (result != 0) {
         throwErrno<CloseFailedEx>();
     }
+    return result;
 }
 
 ssize_t Clib_read(int fd, void* buffer, std::size_t length) {

@@ -8,7 +8,7 @@
 
 int Clib_open(const char* path, int flags, mode_t mode);     // throws OpenFailedEx
 int Clib_creat(const char* path, mode_t mode);               // throws CreateFailedEx
-void Clib_close(int fd);                                     // throws CloseFailedEx
+int Clib_close(int fd);                                      // throws CloseFailedEx
 ssize_t Clib_read(int fd, void* buffer, std::size_t length); // throws ReadFailedEx
 int Clib_dup(int fd);                                        // throws ClibDupFailedEx
 int Clib_dup2(int oldFd, int newFd);                         // throws ClibDup2FailedEx

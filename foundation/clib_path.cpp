@@ -29,16 +29,20 @@ void removeFromEnvironment(const char* block) {
 
 } // namespace
 
-void Clib_chdir(const char* path) {
-    if (chdir(path) != 0) {
+int Clib_chdir(const char* path) {
+    const int result = chdir(path);
+    if (result != 0) {
         throwErrno<ClibChdirFailedEx>();
     }
+    return result;
 }
 
-void Clib_chmod(const char* path, mode_t mode) {
-    if (chmod(path, mode) != 0) {
+int Clib_chmod(const char* path, mode_t mode) {
+    const int result = chmod(path, mode);
+    if (result != 0) {
         throwErrno<ClibChmodFailedEx>();
     }
+    return result;
 }
 
 char* Clib_getcwd(char* buffer, std::size_t size) {
@@ -49,49 +53,61 @@ char* Clib_getcwd(char* buffer, std::size_t size) {
     return result;
 }
 
-void Clib_mkdir(const char* path, mode_t mode) {
-    if (mkdir(path, mode) == -1) {
+int Clib_mkdir(const char* path, mode_t mode) {
+    const int result = mkdir(path, mode);
+    if (result == -1) {
         if (errno == EEXIST) {
             throwErrno<ExistsEx>();
         }
         throwErrno<ClibMkdirFailedEx>();
     }
+    return result;
 }
 
-void Clib_rmdir(const char* path) {
-    if (rmdir(path) == -1) {
+int Clib_rmdir(const char* path) {
+    const int result = rmdir(path);
+    if (result == -1) {
         throwErrno<ClibRmdirFailedEx>();
     }
+    return result;
 }
 
-void Clib_unlink(const char* path) {
-    if (unlink(path) == -1) {
+int Clib_unlink(const char* path) {
+    const int result = unlink(path);
+    if (result == -1) {
         throwErrno<ClibUnlinkFailedEx>();
     }
+    return result;
 }
 
-void Clib_stat(const char* path, struct stat* status) {
-    if (stat(path, status) == -1) {
+int Clib_stat(const char* path, struct stat* status) {
+    const int result = stat(path, status);
+    if (result == -1) {
         throwErrno<ClibStatFailedEx>();
     }
+    return result;
 }
 
-void Clib_utime(const char* path) {
-    if (utime(path, nullptr) == -1) {
+int Clib_utime(const char* path) {
+    const int result = utime(path, nullptr);
+    if (result == -1) {
         throwErrno<ClibUtimeFailedEx>();
     }
+    return result;
 }
 
-void Clib_checkProcess(int processId) {
+int Clib_checkProcess(int processId) {
     char path[sizeof "/proc/-2147483648"];
     Clib_snprintf(path, sizeof path, "/proc/%d", processId);
     struct stat status {};
-    if (stat(path, &status) == -1) {
+    const int result = stat(path, &status);
+    if (result == -1) {
         throwErrno<ClibGetProcStatusFailedEx>();
     }
+    return result;
 }
 
-void Clib_setenv(const char* name, const char* value) {
+int Clib_setenv(const char* name, const char* value) {
     std::string text(name);
     text += "=";
     text += value;
@@ -109,6 +125,7 @@ void Clib_setenv(const char* name, const char* value) {
     if (result != 0) {
         throw ClibPutenvFailedEx(ErrnoText(error).text);
     }
+    return result;
 }
 
 int Clib_mkstemp(char* templateFile) {

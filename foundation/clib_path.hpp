@@ -1,5 +1,5 @@
 // Directories, paths, processes and the environment: each function makes the C library's call of its name and
-// turns a failure into an exception that carries the system's error text.
+// turns a failure into an exception that carries the system's error text; an int result is the call's own, 0.
 #pragma once
 
 #include <sys/stat.h>
@@ -7,19 +7,19 @@
 
 #include <cstddef>
 
-void Clib_chdir(const char* path);                     // throws ClibChdirFailedEx
-void Clib_chmod(const char* path, mode_t mode);        // throws ClibChmodFailedEx
-char* Clib_getcwd(char* buffer, std::size_t size);     // throws ClibPwdFailedEx; returns `buffer`
-void Clib_mkdir(const char* path, mode_t mode);        // throws ExistsEx (EEXIST) or ClibMkdirFailedEx
-void Clib_rmdir(const char* path);                     // throws ClibRmdirFailedEx
-void Clib_unlink(const char* path);                    // throws ClibUnlinkFailedEx
-void Clib_stat(const char* path, struct stat* status); // throws ClibStatFailedEx
-void Clib_utime(const char* path);                     // both times become now; throws ClibUtimeFailedEx
-void Clib_checkProcess(int processId);                 // throws ClibGetProcStatusFailedEx if there is none
+int Clib_chdir(const char* path);                     // throws ClibChdirFailedEx
+int Clib_chmod(const char* path, mode_t mode);        // throws ClibChmodFailedEx
+char* Clib_getcwd(char* buffer, std::size_t size);    // throws ClibPwdFailedEx; returns `buffer`
+int Clib_mkdir(const char* path, mode_t mode);        // throws ExistsEx (EEXIST) or ClibMkdirFailedEx
+int Clib_rmdir(const char* path);                     // throws ClibRmdirFailedEx
+int Clib_unlink(const char* path);                    // throws ClibUnlinkFailedEx
+int Clib_stat(const char* path, struct stat* status); // throws ClibStatFailedEx
+int Clib_utime(const char* path);                     // both times become now; throws ClibUtimeFailedEx
+int Clib_checkProcess(int processId);                 // throws ClibGetProcStatusFailedEx if there is none
 
 // Puts name=value into the environment and takes it back before it returns, so that the variable no longer
 // holds the text afterwards. Throws ClibPutenvFailedEx, or NoMemoryEx "No Memory\n".
-void Clib_setenv(const char* name, const char* value);
+int Clib_setenv(const char* name, const char* value);
 
 // The descriptor of a new file whose name is made in place from the template's "XXXXXX", or -1 (errno set).
 // A null template is fatal.

@@ -52,10 +52,12 @@ std::FILE* Clib_freopen(const char* path, int mode, std::FILE* stream) {
     return opened(std::freopen(path, mode == ClibFM_WriteUpdate ? "" : modeString(mode), stream));
 }
 
-void Clib_fclose(std::FILE* stream) {
-    if (std::fclose(stream) == -1) {
+int Clib_fclose(std::FILE* stream) {
+    const int result = std::fclose(stream);
+    if (result == -1) {
         throwErrno<CloseFailedEx>();
     }
+    return result;
 }
 
 std::size_t Clib_fread(void* buffer, std::size_t size, std::size_t count, std::FILE* stream) {

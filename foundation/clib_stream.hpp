@@ -21,7 +21,7 @@ std::FILE* Clib_fopen(const char* path, int mode);
 std::FILE* Clib_fdopen(int fd, int mode);
 std::FILE* Clib_freopen(const char* path, int mode, std::FILE* stream);
 
-void Clib_fclose(std::FILE* stream); // throws CloseFailedEx with the system's error text
+int Clib_fclose(std::FILE* stream); // throws CloseFailedEx with the system's error text
 
 // Throw ReadFailedEx "File read failed". The end of the file is no failure: a short count, or null.
 std::size_t Clib_fread(void* buffer, std::size_t size, std::size_t count, std::FILE* stream);

@@ -54,14 +54,16 @@ void Clib_gettimeofday(uint32& seconds, uint16& milliseconds) {
     milliseconds = static_cast<uint16>(now.tv_usec / 1000);
 }
 
-void Clib_msleep(uint32 milliseconds) {
-    Clib_usleep(milliseconds * 1000);
+int Clib_msleep(uint32 milliseconds) {
+    return Clib_usleep(milliseconds * 1000);
 }
 
-void Clib_usleep(uint32 microseconds) {
-    if (usleep(microseconds) == -1) {
+int Clib_usleep(uint32 microseconds) {
+    const int result = usleep(microseconds);
+    if (result == -1) {
         throwErrno<ClibSleepFailedEx>();
     }
+    return result;
 }
 
 unsigned Clib_sleep(unsigned seconds) {

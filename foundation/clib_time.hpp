@@ -21,8 +21,8 @@ std::tm* Clib_localtime(const std::time_t* time, std::tm* parts); // "Localtime(
 // Throws ClibGetTimeFailedEx with the system's error text.
 void Clib_gettimeofday(uint32& seconds, uint16& milliseconds);
 
-// Throw ClibSleepFailedEx with the system's error text.
-void Clib_msleep(uint32 milliseconds);
-void Clib_usleep(uint32 microseconds);
+// Return 0. Throw ClibSleepFailedEx with the system's error text.
+int Clib_msleep(uint32 milliseconds);
+int Clib_usleep(uint32 microseconds);
 
 unsigned Clib_sleep(unsigned seconds); // the seconds left when a signal came
