@@ -9,6 +9,7 @@
 #include "foundation/trace.hpp"
 
 // The bodies spell "this->", "__null" and redundant brackets where the text of a failed assertion shows them.
+// NOLINTBEGIN(modernize-use-nullptr)
 
 ZebBuffer::ZebBuffer(uint32 acUseLength, uint32 acMaxLength) {
     TRACE_ENTRY("ZebBuffer");
@@ -34,13 +35,9 @@ ZebBuffer::ZebBuffer(uint32 acUseLength, uint32 acMaxLength) {
     }
 }
 
-ZebBuffer::ZebBuffer(const uint8* acpPointer, uint32 acLength) {
+ZebBuffer::ZebBuffer(const uint8* acpPointer, uint32 acLength)
+    : mcpPointer(acpPointer), mUseLength(acLength), mMaxLength(acLength), mPersistence(ZebBP_Persistent) {
     TRACE_ENTRY("ZebBuffer");
-    mpPointer = nullptr;
-    mcpPointer = acpPointer;
-    mUseLength = acLength;
-    mMaxLength = acLength;
-    mPersistence = ZebBP_Persistent;
     TRACE_EXIT("ZebBuffer");
 }
 
@@ -149,3 +146,5 @@ void ZebBuffer::writeAscii(char* acpOutput) const {
     }
     TRACE_EXIT("writeAscii");
 }
+
+// NOLINTEND(modernize-use-nullptr)

@@ -28,6 +28,8 @@ public:
     // Wraps `acLength` bytes of the caller's, which must outlive the buffer.
     ZebBuffer(const uint8* acpPointer, uint32 acLength);
 
+    ZebBuffer(const ZebBuffer&) = delete;
+    ZebBuffer& operator=(const ZebBuffer&) = delete;
     ~ZebBuffer() override;
 
     // The byte in use at `acOffset`.

@@ -129,7 +129,7 @@ int Clib_setenv(const char* name, const char* value) {
 }
 
 int Clib_mkstemp(char* templateFile) {
-    ASSERT_OR_EXIT(templateFile != __null);
+    ASSERT_OR_EXIT(templateFile != __null); // NOLINT(modernize-use-nullptr): the text that the log shows
     return mkstemp(templateFile);
 }
 

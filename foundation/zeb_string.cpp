@@ -7,6 +7,9 @@
 #include "foundation/exceptions.hpp"
 #include "foundation/trace.hpp"
 
+// The assertions spell null pointers as the log shows them.
+// NOLINTBEGIN(modernize-use-nullptr)
+
 ZebString::ZebString(const char* acpString) {
     take(new (std::nothrow) std::string(acpString));
 }
@@ -18,6 +21,7 @@ ZebString::ZebString(const ZebString& acrCopy) {
 
 ZebString& ZebString::operator=(const ZebString& acrCopy) {
     if (this != &acrCopy) {
+        // NOLINTNEXTLINE(readability-redundant-smartptr-get): get asserts less than the operator
         take(new (std::nothrow) std::string(*acrCopy.mString.get()));
     }
     return *this;
@@ -111,3 +115,5 @@ ZebString ZebString::substr(size_type pos, size_type n) const {
         throw InvalidEx("Invalid\n");
     }
 }
+
+// NOLINTEND(modernize-use-nullptr)
