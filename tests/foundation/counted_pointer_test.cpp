@@ -107,8 +107,8 @@ TEST(CountedPointer, LetsGoAtTheEndOfItsLife) {
     {
         const auto first = probe(endings, 1);
         {
-            const auto second =
-                first; // NOLINT(performance-unnecessary-copy-initialization): the copy is the test
+            // NOLINTNEXTLINE(performance-unnecessary-copy-initialization): the copy is the test
+            const auto second = first;
             EXPECT_EQ(second.get(), first.get());
         }
         EXPECT_TRUE(endings.empty());

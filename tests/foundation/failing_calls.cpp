@@ -27,6 +27,8 @@ Function* next(const char* name) {
 
 } // namespace
 
+// NOLINTBEGIN(readability-inconsistent-declaration-parameter-name): the C library names its own with
+// underscores
 extern "C" {
 
 int putenv(char* text) noexcept {
@@ -71,6 +73,7 @@ char* strdup(const char* text) noexcept {
     return fails(gFailingCalls.strdup) ? nullptr : real(text);
 }
 }
+// NOLINTEND(readability-inconsistent-declaration-parameter-name)
 
 void* operator new(std::size_t size, const std::nothrow_t& /*tag*/) noexcept {
     if (gFailingCalls.nothrowNews) {
