@@ -44,12 +44,12 @@ PortAttributes::PortAttributes(uint32 count) : mCount(count) {
     // Pointers count as the 32-bit program's, for the same line between possible and not in both builds.
     constexpr uint32 kMostPointers = 0x7FFFFFFF / 4;
     if (count <= kMostPointers) {
-        mpRecords = new (std::nothrow) HBA_PORTATTRIBUTES* [count] {};
+        mpRecords = new (std::nothrow) HBA_PORTATTRIBUTES*[count];
     }
 }
 
 PortAttributes::~PortAttributes() {
-    for (uint32 i = 0; mpRecords != nullptr && i < mCount && mpRecords[i] != nullptr; ++i) {
+    for (uint32 i = 0; i < mMade; ++i) {
         delete mpRecords[i];
     }
     delete[] mpRecords;
@@ -60,9 +60,9 @@ bool PortAttributes::allocateRecords() {
     if (mCount > kMostRecords) {
         return false;
     }
-    for (uint32 i = 0; i < mCount; ++i) {
-        mpRecords[i] = new (std::nothrow) HBA_PORTATTRIBUTES();
-        if (mpRecords[i] == nullptr) {
+    for (; mMade < mCount; ++mMade) {
+        mpRecords[mMade] = new (std::nothrow) HBA_PORTATTRIBUTES();
+        if (mpRecords[mMade] == nullptr) {
             return false;
         }
     }

@@ -31,7 +31,9 @@ public:
 
 private:
     uint32 mCount;
-    HBA_PORTATTRIBUTES** mpRecords = nullptr;
+    uint32 mMade = 0; // records that exist
+    HBA_PORTATTRIBUTES** mpRecords =
+        nullptr; // set up to the last of them, so that a made-up count costs no memory
 };
 
 // A target mapping of either layout: one zeroed malloc block, an entry count and then the entries.
