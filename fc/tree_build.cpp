@@ -37,11 +37,13 @@ timeval wallClock() {
     return now;
 }
 
-// A zeroed mapping with room for `capacity` entries, and a count of 0. Throws NoMemoryEx "No Memory\n".
+// A zeroed mapping with room for `capacity` entries, and a count of 0, for sBuildTargetMappings. Throws
+// NoMemoryEx "No Memory\n".
 BuiltMapping allocateBuiltMapping(uint32 capacity) {
     const std::size_t size = mappingBlockSize<HBA_FCPTARGETMAPPINGV2, HBA_FCPSCSIENTRYV2>(capacity);
     void* const block = size != 0 ? std::calloc(1, size) : nullptr;
     if (block == nullptr) {
+        TRACE_EXIT("sBuildTargetMappings");
         throw NoMemoryEx("No Memory\n");
     }
     return {static_cast<HBA_FCPTARGETMAPPINGV2*>(block), &std::free};
