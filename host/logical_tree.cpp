@@ -32,8 +32,8 @@ void reportLine(char* line) {
 } // namespace
 
 uint32 gatherLogicalInfo() {
-    TRACE_ENTRY("gatherLogicalInfo");
     try {
+        TRACE_ENTRY("gatherLogicalInfo");
         std::FILE* const stream = Clib_fopen("/proc/partitions", ClibFM_Read);
         char line[kLineSize] = {};
         while (Clib_fgets(line, sizeof line, stream) != nullptr) {
