@@ -71,6 +71,7 @@ TEST_F(DasTree, ReportsALinkThatLeadsToHardware) {
     mIdentity.identifier("/dev/sda", "6006");
     EXPECT_EQ(gathered(), reported("sda", "6006"));
     EXPECT_EQ(mIdentity.questions(), std::vector<std::string>{"identifier /dev/sda 2"});
+    const LogCapture quiet;
     EXPECT_EQ(getDeviceType("/dev/sda"), TREE_DAS);
 }
 

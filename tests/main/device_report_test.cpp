@@ -79,6 +79,7 @@ TEST_F(DeviceReport, ShowsADirectlyAttachedDiskAndClaimsIt) {
     mIdentity.identifier("/dev/sda", "6006");
     EXPECT_EQ(logOf(TREE_DAS, "sda"), kEntered + kUnclaimed + kConfirmed + claimLog("/dev/sda") +
                                           "\n--------> Device Name: |/dev/sda| LunId: |6006|\n\n");
+    const LogCapture quiet;
     EXPECT_EQ(getDeviceType("/dev/sda"), TREE_DAS);
     EXPECT_EQ(mIdentity.questions(), std::vector<std::string>{"identifier /dev/sda 2"});
 }
@@ -151,6 +152,7 @@ TEST_F(DeviceReport, CallsADiskUnsupportedThatCannotBeAsked) {
     EXPECT_EQ(logOf(TREE_DAS, "sda"), kEntered + kUnclaimed + kConfirmed +
                                           "Exception occured while getting LUN ID for device /dev/sda\n"
                                           "\n--------> Device Name: |/dev/sda| is not supported\n\n");
+    const LogCapture quiet;
     EXPECT_EQ(getDeviceType("/dev/sda"), 0U);
 }
 

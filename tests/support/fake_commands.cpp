@@ -44,6 +44,10 @@ FakeCommands::FakeCommands() {
 
 FakeCommands::~FakeCommands() {
     gCommands = nullptr;
+    for (std::FILE* const stream : gOpenStreams) {
+        static_cast<void>(std::fclose(stream));
+    }
+    gOpenStreams.clear();
 }
 
 FakeRun FakeCommands::take(const std::string& command) {

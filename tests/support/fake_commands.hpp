@@ -14,7 +14,8 @@ struct FakeRun {
 };
 
 // While it lives no command is run: each run of a command gives its next answer, and prints nothing once the
-// answers are used up. Without one, popen and pclose are the C library's.
+// answers are used up. Streams that are left open are closed at its end. Without one, popen and pclose are
+// the C library's.
 class FakeCommands {
 public:
     FakeCommands();
