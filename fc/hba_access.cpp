@@ -31,11 +31,19 @@ MappingBlock<HBA_FCPTARGETMAPPING> allocateMapping(std::size_t size) {
     return {static_cast<HBA_FCPTARGETMAPPING*>(block), &std::free};
 }
 
-// The mapping as it is handed out: a count beyond the `size` bytes of the block is cut to what they hold.
-MappingBlock<HBA_FCPTARGETMAPPING> withinBlock(MappingBlock<HBA_FCPTARGETMAPPING> mapping, std::size_t size) {
-    const std::size_t room = (size - offsetof(HBA_FCPTARGETMAPPING, entry)) / sizeof(HBA_FCPSCSIENTRY);
-    mapping->NumberOfEntries = static_cast<HBA_UINT32>(std::min<std::size_t>(mapping->NumberOfEntries, room));
+// The mapping as it is handed out: a count above what the block has `room` for is cut to it.
+MappingBlock<HBA_FCPTARGETMAPPING> withinBlock(MappingBlock<HBA_FCPTARGETMAPPING> mapping, uint32 room) {
+    mapping->NumberOfEntries = std::min(mapping->NumberOfEntries, room);
     return mapping;
+}
+
+// How many of the library's entries fit into a block that was made for `count` of the longer built ones. The
+// records' sizes are those of the 64-bit header, whose ratio is the smaller: both builds take in as many.
+uint32 roomForCount(uint32 count) {
+    constexpr uint64 kEntrySize = 304;
+    constexpr uint64 kBuiltEntrySize = 560;
+    static_assert(sizeof(HBA_FCPSCSIENTRYV2) * kEntrySize >= kBuiltEntrySize * sizeof(HBA_FCPSCSIENTRY));
+    return static_cast<uint32>(count * kBuiltEntrySize / kEntrySize);
 }
 
 } // namespace
@@ -187,8 +195,8 @@ std::unique_ptr<PortAttributes> HA_GetAdapterPorts(HBA_HANDLE handle, const HBA_
 MappingBlock<HBA_FCPTARGETMAPPING> HA_GetTargetMappings(HBA_HANDLE handle) {
     TRACE_ENTRY("HA_GetTargetMappings");
     logPrintf("Allocating memory for single target mapping\n");
-    std::size_t size = mappingBlockSize<HBA_FCPTARGETMAPPING, HBA_FCPSCSIENTRY>(1);
-    auto mapping = allocateMapping(size);
+    uint32 room = 1;
+    auto mapping = allocateMapping(mappingBlockSize<HBA_FCPTARGETMAPPING, HBA_FCPSCSIENTRY>(room));
     if (!mapping) {
         leaveWithHaltEx("HA_GetTargetMappings", "Failed to allocate memory for target mappings\n",
                         "No memory for target mapping\n");
@@ -207,8 +215,8 @@ MappingBlock<HBA_FCPTARGETMAPPING> HA_GetTargetMappings(HBA_HANDLE handle) {
         mapping.reset();
         logPrintf("Allocating memory for multiple target mapping\n");
         // Room for the longer entries of the built mapping, though the library fills the shorter ones.
-        size = mappingBlockSize<HBA_FCPTARGETMAPPING, HBA_FCPSCSIENTRYV2>(count);
-        mapping = allocateMapping(size);
+        room = roomForCount(count);
+        mapping = allocateMapping(mappingBlockSize<HBA_FCPTARGETMAPPING, HBA_FCPSCSIENTRYV2>(count));
         if (!mapping) {
             leaveWithHaltEx("HA_GetTargetMappings", "Failed to allocate target mappings\n",
                             "No memory for target mappings\n");
@@ -225,5 +233,5 @@ MappingBlock<HBA_FCPTARGETMAPPING> HA_GetTargetMappings(HBA_HANDLE handle) {
         }
     }
     TRACE_EXIT("HA_GetTargetMappings");
-    return withinBlock(std::move(mapping), size);
+    return withinBlock(std::move(mapping), room);
 }

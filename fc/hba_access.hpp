@@ -32,8 +32,8 @@ public:
 private:
     uint32 mCount;
     uint32 mMade = 0; // records that exist
-    HBA_PORTATTRIBUTES** mpRecords =
-        nullptr; // set up to the last of them, so that a made-up count costs no memory
+    // Set up to the last record that exists: a count that a library made up costs no memory.
+    HBA_PORTATTRIBUTES** mpRecords = nullptr;
 };
 
 // A target mapping of either layout: one zeroed malloc block, an entry count and then the entries.
