@@ -102,8 +102,8 @@ int wrappedIoctl(int fd, unsigned long request, void* argument) {
         return fail(answer.ioctlError);
     }
     const uint32 allocationLength = header.cmd_len == 6 ? header.cmdp[3] * 256U + header.cmdp[4] : 0;
-    copyInto(static_cast<unsigned char*>(header.dxferp), std::min(header.dxfer_len, allocationLength),
-             answer.data);
+    const uint32 room = answer.overruns ? header.dxfer_len : std::min(header.dxfer_len, allocationLength);
+    copyInto(static_cast<unsigned char*>(header.dxferp), room, answer.data);
     header.status = answer.status;
     header.host_status = answer.hostStatus;
     header.driver_status = answer.driverStatus;
@@ -116,6 +116,10 @@ int wrappedIoctl(int fd, unsigned long request, void* argument) {
 int wrappedFtime(timeb* now) {
     if (now->time != 0 || now->millitm != 0 || now->timezone != 0 || now->dstflag != 0) {
         ++gKernel->unclearedTimes;
+    }
+    const bool isStart = gKernel->timesAsked++ % 2 == 0;
+    if (isStart && gKernel->beforeCommand) {
+        gKernel->beforeCommand();
     }
     now->time = static_cast<time_t>(gKernel->clockMs / 1000);
     now->millitm = static_cast<unsigned short>(gKernel->clockMs % 1000);

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <deque>
+#include <functional>
 #include <set>
 #include <string>
 #include <vector>
@@ -13,13 +14,14 @@ using Bytes = std::vector<uint8>;
 
 // What one command meets.
 struct SgAnswer {
-    Bytes data;         // what the device has to say; no more than the CDB's allocation length is delivered
+    Bytes data; // what the device has to say, of which it sends as much as the CDB's allocation length allows
     int ioctlError = 0; // the driver refuses the command with this errno
     uint8 status = 0;
     uint16 hostStatus = 0;
     uint16 driverStatus = 0;
     Bytes sense;
     int elapsedMs = 0;
+    bool overruns = false; // the device sends all it has, as far as the buffer takes it
 };
 
 // A command as the driver got it.
@@ -53,6 +55,7 @@ public:
     int openError = 0;            // every open fails with this errno
     int closeError = 0;           // every close fails with this errno, though the descriptor is gone
     long long clockMs = 1'000'000;
+    std::function<void()> beforeCommand; // called before a command is sent; the one call here that may throw
 
     // What it did.
     std::vector<SgCommand> commands;
@@ -60,5 +63,6 @@ public:
     std::set<int> openDescriptors;
     int closes = 0;
     int closesOfNothing = 0;
+    int timesAsked = 0;     // once before and once after every command
     int unclearedTimes = 0; // time stamps that were not zeroed before they were asked for
 };
