@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <iterator>
 #include <numeric>
 
 #include "fc/unique_lun_id.hpp"
@@ -108,18 +109,31 @@ protected:
     }
 };
 
+// Whether those that do not count stand in one fixed order: their other orders show nothing new.
+bool isRepresentative(const std::vector<std::size_t>& order, unsigned counting) {
+    std::vector<std::size_t> others;
+    std::copy_if(order.begin(), order.end(), std::back_inserter(others),
+                 [&](std::size_t index) { return (counting >> index & 1U) == 0; });
+    return std::is_sorted(others.begin(), others.end());
+}
+
 TEST_P(DesignatorPreference, IsTheSameInWhateverOrderTheDesignatorsStand) {
     std::vector<std::size_t> order(kinds().size());
     std::iota(order.begin(), order.end(), 0U);
+    int asked = 0;
     do {
         for (unsigned counting = 0; counting < 32; ++counting) {
-            SCOPED_TRACE(testing::PrintToString(order) + " " + std::to_string(counting));
-            ask(order, counting);
+            if (isRepresentative(order, counting)) {
+                SCOPED_TRACE(testing::PrintToString(order) + " " + std::to_string(counting));
+                ask(order, counting);
+                ++asked;
+            }
             if (HasFatalFailure()) {
                 return;
             }
         }
     } while (std::next_permutation(order.begin(), order.end()));
+    EXPECT_EQ(asked, 1546); // all ways to choose some of the five, in all orders, among the rest
 }
 
 INSTANTIATE_TEST_SUITE_P(RequestFlag, DesignatorPreference, testing::ValuesIn(kFlags));

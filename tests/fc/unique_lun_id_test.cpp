@@ -39,8 +39,8 @@ Bytes naaPage() {
 
 class UniqueLunId : public testing::Test {
 protected:
-    UniqueLunId() { gDirectAttachedFlag = false; }
-    ~UniqueLunId() override { gDirectAttachedFlag = false; }
+    void SetUp() override { gDirectAttachedFlag = false; }
+    void TearDown() override { gDirectAttachedFlag = false; }
 
     // Asks a device that answers so; returns the identifier.
     std::string ask(const std::deque<SgAnswer>& answers, uint32 requestFlag, const char* device = kDevice) {
@@ -62,7 +62,7 @@ protected:
         mKernel.answers = answers;
         ZebString identifier("as before");
         const LogCapture log;
-        const std::string message =
+        std::string message =
             messageOf<Exception>([&] { HA_GetScsiUniqueLunId(device, identifier, requestFlag); });
         mLog = withoutAddresses(log.text());
         EXPECT_STREQ(identifier.c_str(), "as before");
@@ -81,7 +81,7 @@ protected:
     std::string printRefusal(const std::deque<SgAnswer>& answers, const char* device = kDevice) {
         mKernel.answers = answers;
         const LogCapture log;
-        const std::string message = messageOf<Exception>([&] { HA_PrintVendorProductId(device); });
+        std::string message = messageOf<Exception>([&] { HA_PrintVendorProductId(device); });
         mLog = log.text();
         return message;
     }
@@ -648,7 +648,7 @@ TEST_F(StdInquiryFailure, MalformedData) {
     expectNothingOpen();
     EXPECT_EQ(printRefusal<InvalidEx>({good(shortData)}), "Input does not represent std inquiry response\n");
     EXPECT_EQ(mLog, entered("HA_PrintVendorProductId") + traced("open") + didStandardInquiry() + field +
-                        freedBuffer() + line + traced("close") + left("HA_PrintVendorProductId"));
+                        line + traced("close") + left("HA_PrintVendorProductId") + freedBuffer());
     expectNothingOpen();
 }
 
@@ -741,7 +741,7 @@ TEST_F(UniqueLunId, VendorAndProductAreLoggedWithoutTheirBlanks) {
     };
     EXPECT_EQ(mLog, entered("HA_PrintVendorProductId") + traced("open") + didStandardInquiry() + field("0") +
                         field("1") + field("2") + "Vendor EMC ProductId SYMMETRIX ProductRev 5 1\n" +
-                        freedBuffer() + traced("close") + left("HA_PrintVendorProductId"));
+                        traced("close") + left("HA_PrintVendorProductId") + freedBuffer());
     expectNothingOpen();
 }
 

@@ -68,7 +68,7 @@ TEST_F(DeviceIdentification, WithoutDescriptorsFailsWithoutASecondCommand) {
                               left("getDeviceIdentificationVpd") + freedContext());
 }
 
-TEST_F(DeviceIdentification, AnswersTheFirstPassInTheMeasureOfItsAllocationLength) {
+TEST_F(DeviceIdentification, WithAListAbove255BytesNeedsBothLengthBytes) {
     const Bytes page = vpdPage(0x83, Bytes(0x0102, 0xAB));
     mKernel.answers = {good(page), good(page)};
     const LogCapture unheard;
@@ -157,7 +157,7 @@ protected:
     std::string refusal() {
         Designator designator;
         const LogCapture log;
-        const std::string message = messageOf<Exception>([&] {
+        std::string message = messageOf<Exception>([&] {
             mInquiry.getDiPageIdentifierAscii(mPage, mOffset, designator.type, designator.association,
                                               designator.text);
         });

@@ -10,11 +10,11 @@ namespace {
 
 class InquiryCdb : public testing::Test {
 protected:
-    InquiryCdb() {
+    void SetUp() override {
         const LogCapture unheard;
         mContext.create(new ZebScsiIoContextLinux, ZebPST_Individual, ZebPAT_New);
     }
-    ~InquiryCdb() override {
+    void TearDown() override {
         const LogCapture unheard;
         mContext.release();
     }

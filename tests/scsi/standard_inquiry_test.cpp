@@ -254,7 +254,7 @@ protected:
         const ZebScsiInquiry::Response response = responseOf(data);
         ZebString text("");
         const LogCapture log;
-        const std::string message =
+        std::string message =
             messageOf<Exception>([&] { mInquiry.getInquiryFieldAscii(response, type, text); });
         mLog = log.text();
         return message;

@@ -17,8 +17,8 @@ protected:
     static constexpr int kFd = 7;
     static constexpr uint32 kTimeOutMs = 4321;
 
-    InquiryFixture() { mHandler.create(new ZebScsiIoHandlerLinux, ZebPST_Individual, ZebPAT_New); }
-    ~InquiryFixture() override {
+    void SetUp() override { mHandler.create(new ZebScsiIoHandlerLinux, ZebPST_Individual, ZebPAT_New); }
+    void TearDown() override {
         const LogCapture unheard;
         mResponse.release();
     }
