@@ -1,0 +1,164 @@
+// simhost HOST.toml [--record FILE] [--keep DIR] -- PROGRAM [ARGUMENT...]
+// Runs a program on a simulated host; README.md says how.
+#include "simhost/description.hpp"
+#include "simhost/file_descriptor.hpp"
+#include "simhost/record.hpp"
+#include "simhost/supervisor.hpp"
+#include "simhost/world.hpp"
+
+#include <csignal>
+#include <cstring>
+#include <fcntl.h>
+#include <filesystem>
+#include <iostream>
+#include <optional>
+#include <sched.h>
+#include <string>
+#include <string_view>
+#include <sys/prctl.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+
+namespace simhost {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr int cannotSetUp = 125;
+constexpr int cannotRun = 127;
+
+constexpr std::string_view usage =
+    "usage: simhost HOST.toml [--record FILE] [--keep DIR] -- PROGRAM [ARGUMENT...]\n";
+
+struct Arguments {
+    fs::path description;
+    fs::path record; // empty = none
+    fs::path keep;   // empty = none
+    char** program = nullptr;
+};
+
+std::optional<Arguments> readArguments(int count, char** values) {
+    Arguments arguments;
+    for (int i = 1; i < count; ++i) {
+        const std::string_view value = values[i];
+        if (value == "--" && i + 1 < count && !arguments.description.empty()) {
+            arguments.program = values + i + 1;
+            return arguments;
+        }
+        if (value == "--record" && i + 1 < count)
+            arguments.record = values[++i];
+        else if (value == "--keep" && i + 1 < count)
+            arguments.keep = values[++i];
+        else if (arguments.description.empty() && value.substr(0, 1) != "-")
+            arguments.description = value;
+        else
+            return std::nullopt;
+    }
+    return std::nullopt;
+}
+
+// The status that a shell gives for a process that ended like this.
+int shellStatus(int waitStatus) {
+    return WIFEXITED(waitStatus) ? WEXITSTATUS(waitStatus) : 128 + WTERMSIG(waitStatus);
+}
+
+// The simulated host's first process: builds the host, runs the program in it and ends with its status. It is
+// not the program itself because the kernel spares a first process from signals that would end another.
+// It sends the number of its listener through `report`, and goes on when `proceed` is closed.
+int firstProcess(const Host& host, const Arguments& arguments, FileDescriptor report,
+                 const FileDescriptor& proceed) {
+    check(::prctl(PR_SET_PDEATHSIG, SIGKILL), "tying the host to its supervisor");
+    const fs::path folder = fs::read_symlink("/proc/self/exe").parent_path();
+    const Helpers helpers{folder / "simhost-command", folder / "libsimhba64.so", folder / "libsimhba32.so"};
+    enterWorld(host, helpers, arguments.record, arguments.keep);
+    {
+        const FileDescriptor listener = installSgIoFilter();
+        const int number = listener.get();
+        check(::write(report.get(), &number, sizeof number), "reporting");
+        report.reset();
+        char none = 0;
+        check(::read(proceed.get(), &none, 1), "waiting for the supervisor");
+    }
+    const pid_t program = check(::fork(), "fork");
+    if (program == 0) {
+        ::prctl(PR_SET_PDEATHSIG, 0);
+        ::execvp(arguments.program[0], arguments.program);
+        std::cerr << "simhost: " << arguments.program[0] << ": " << std::strerror(errno) << '\n';
+        ::_exit(cannotRun);
+    }
+    int status = 0;
+    while (check(::waitpid(-1, &status, 0), "waiting for the program") != program) {
+        // a process that the program left behind
+    }
+    return shellStatus(status);
+}
+
+struct Pipe {
+    FileDescriptor reading;
+    FileDescriptor writing;
+};
+
+Pipe makePipe() {
+    int ends[2];
+    check(::pipe2(ends, O_CLOEXEC), "pipe");
+    return {FileDescriptor(ends[0]), FileDescriptor(ends[1])};
+}
+
+int run(const Host& host, Arguments arguments) {
+    Record record;
+    if (!arguments.record.empty()) {
+        record = Record(arguments.record);
+        arguments.record = fs::absolute(arguments.record);
+    }
+    if (!arguments.keep.empty()) {
+        fs::create_directories(arguments.keep);
+        arguments.keep = fs::absolute(arguments.keep);
+    }
+    Pipe report = makePipe();
+    Pipe proceed = makePipe();
+    const auto init =
+        static_cast<pid_t>(check(::syscall(SYS_clone, CLONE_NEWNS | CLONE_NEWUTS | CLONE_NEWPID | SIGCHLD,
+                                           nullptr, nullptr, nullptr, nullptr),
+                                 "making the host's namespaces (simhost needs root)"));
+    if (init == 0) {
+        report.reading.reset();
+        proceed.writing.reset();
+        try {
+            ::_exit(firstProcess(host, arguments, std::move(report.writing), proceed.reading));
+        } catch (const std::exception& error) {
+            std::cerr << "simhost: " << error.what() << '\n';
+            ::_exit(cannotSetUp);
+        }
+    }
+    report.writing.reset();
+    int listenerNumber = -1;
+    if (::read(report.reading.get(), &listenerNumber, sizeof listenerNumber) == sizeof listenerNumber) {
+        const FileDescriptor initDescriptor(
+            static_cast<int>(check(::syscall(SYS_pidfd_open, init, 0), "watching the host")));
+        FileDescriptor listener(static_cast<int>(check(
+            ::syscall(SYS_pidfd_getfd, initDescriptor.get(), listenerNumber, 0), "taking the listener")));
+        Supervisor supervisor(std::move(listener), init, host.disks, record);
+        proceed.writing.reset();
+        supervisor.run(initDescriptor.get());
+    }
+    int status = 0;
+    check(::waitpid(init, &status, 0), "waiting for the host");
+    return shellStatus(status);
+}
+
+} // namespace
+} // namespace simhost
+
+int main(int argumentCount, char** argumentValues) {
+    const auto arguments = simhost::readArguments(argumentCount, argumentValues);
+    if (!arguments) {
+        std::cerr << simhost::usage;
+        return 2;
+    }
+    try {
+        return simhost::run(simhost::readDescription(arguments->description), *arguments);
+    } catch (const std::exception& error) {
+        std::cerr << "simhost: " << error.what() << '\n';
+        return simhost::cannotSetUp;
+    }
+}
