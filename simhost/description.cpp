@@ -359,6 +359,8 @@ Disk diskOf(const toml::table& table, const std::string& where) {
 
 // ---- Fibre Channel ----
 
+constexpr std::size_t longestAdapterName = 255; // libHBAAPI needs the NUL
+
 Wwn wwnOf(std::string text, const toml::node& node, const std::string& where) {
     std::replace(text.begin(), text.end(), ':', ' ');
     const Bytes bytes = bytesOfHex(text, where);
@@ -417,6 +419,8 @@ Adapter adapterOf(const toml::table& table, std::size_t index) {
     Keys keys(table, where);
     Adapter adapter;
     adapter.name = keys.bytes("name").value_or("simhba-" + std::to_string(index));
+    if (adapter.name.size() > longestAdapterName)
+        refuse(table, where, "a name has at most 255 bytes");
     adapter.manufacturer = keys.bytes("manufacturer").value_or("");
     adapter.model = keys.bytes("model").value_or("");
     adapter.nodeWwn = wwnOf(keys, "wwnn", table);
@@ -482,9 +486,8 @@ Host hostOf(const toml::table& document) {
         host.disks.push_back(diskOf(table, "disk " + std::to_string(host.disks.size())));
     addFibreChannel(keys, host);
     if (host.vendorLibrary)
-        host.files.try_emplace(
-            "/etc/hba.conf", File{File::Kind::Content, std::string("org.simhost.hba64 ") + vendorLibrary64 +
-                                                           "\norg.simhost.hba32 " + vendorLibrary32 + "\n"});
+        host.files.try_emplace("/etc/hba.conf", File{File::Kind::Content, std::string("org.simhost.hba ") +
+                                                                              vendorLibraryName + "\n"});
     keys.refuseUnknown();
     return host;
 }

@@ -132,9 +132,9 @@ struct Host {
 inline constexpr std::array<const char*, 3> commandPaths = {"/sbin/iscsiadm", "/usr/bin/pgrep",
                                                             "/sbin/powermt"};
 
-// Where the vendor library's two builds stand in a simulated host, for /etc/hba.conf.
-inline constexpr const char* vendorLibrary64 = "/.simhost/libsimhba64.so";
-inline constexpr const char* vendorLibrary32 = "/.simhost/libsimhba32.so";
+// The vendor library as /etc/hba.conf names it. The loader of each word size puts its own folder for $LIB, so
+// that one line serves both word sizes and a message that shows the path is the same in both.
+inline constexpr const char* vendorLibraryName = "/.simhost/$LIB/libsimhba.so";
 
 // Reads a description; throws DescriptionError.
 Host readDescription(const std::filesystem::path& path);

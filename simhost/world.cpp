@@ -205,6 +205,7 @@ void makeCommand(const fs::path& path, const std::vector<CommandAnswer>& answers
 }
 
 void bindFile(const fs::path& source, const fs::path& target) {
+    fs::create_directories(target.parent_path());
     writeFile(target, {});
     bind(source, target);
 }
@@ -265,8 +266,9 @@ void enterWorld(const Host& host, const Helpers& helpers, const fs::path& record
 
     if (host.vendorLibrary) {
         writeFile(inRoot(adapterFilePath), adapterFile(*host.vendorLibrary, host.adapters));
-        bindFile(helpers.vendorLibrary64, inRoot(vendorLibrary64));
-        bindFile(helpers.vendorLibrary32, inRoot(vendorLibrary32));
+        bindFile(helpers.vendorLibrary64, own / "lib/x86_64-linux-gnu/libsimhba.so");
+        for (const char* folder : {"lib32", "lib/i386-linux-gnu"}) // as multilib and i386 packages have it
+            bindFile(helpers.vendorLibrary32, own / folder / "libsimhba.so");
     }
     if (!record.empty())
         bindFile(record, own / "record");
