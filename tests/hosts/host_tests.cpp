@@ -1,0 +1,90 @@
+// Every simulated host of this folder: what Morvane does there, as a whole. A host is a folder with
+//   host.toml         the description (simhost/README.md)
+//   expected.log      the whole log, normalised (log_comparison.hpp)
+//   expected.record   what was asked of the host
+// and, where a run does not end with "Test completed.\n", nothing on standard error and status 0,
+//   expected.output, expected.error, expected.status
+// With MORVANE_ACCEPT set in the environment the files are written instead of compared; review the difference.
+#include "tests/hosts/log_comparison.hpp"
+#include "tests/support/process.hpp"
+
+#include <algorithm>
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <gtest/gtest.h>
+#include <map>
+
+namespace test {
+namespace {
+
+namespace fs = std::filesystem;
+
+using Texts = std::map<std::string, std::string>; // by the name of the file that holds the expected one
+
+const Texts defaults = {{"expected.output", "Test completed.\n"}, {"expected.error", ""}, {"expected.status", "0\n"}};
+
+const fs::path hostsFolder = HOSTS_FOLDER;
+
+std::vector<std::string> hostNames() {
+    std::vector<std::string> names;
+    for (const auto& entry : fs::directory_iterator(hostsFolder))
+        if (fs::exists(entry.path() / "host.toml"))
+            names.push_back(entry.path().filename());
+    std::sort(names.begin(), names.end());
+    return names;
+}
+
+Texts runOnHost(const std::string& name) {
+    const TemporaryDirectory scratch;
+    const fs::path work = scratch.path() / "work";
+    const fs::path record = scratch.path() / "record";
+    fs::create_directory(work);
+    const ProcessResult result = runProcess({SIMHOST_PROGRAM, hostsFolder / name / "host.toml", "--record",
+                                             record.string(), "--", MORVANE_PROGRAM},
+                                            work);
+    return {{"expected.log", normalised(contentOf(work / "MorvaneLogs/Morvane.log"))},
+            {"expected.record", contentOf(record)},
+            {"expected.output", result.output},
+            {"expected.error", result.error},
+            {"expected.status", std::to_string(result.status) + "\n"}};
+}
+
+void accept(const fs::path& folder, const Texts& texts) {
+    for (const auto& [file, text] : texts) {
+        const auto usual = defaults.find(file);
+        if (usual != defaults.end() && usual->second == text)
+            fs::remove(folder / file);
+        else
+            std::ofstream(folder / file, std::ios::binary) << text;
+    }
+}
+
+class SimulatedHost : public testing::TestWithParam<std::string> {};
+
+TEST_P(SimulatedHost, isReportedAsExpected) {
+    const fs::path folder = hostsFolder / GetParam();
+    const Texts actual = runOnHost(GetParam());
+    if (std::getenv("MORVANE_ACCEPT") != nullptr) {
+        accept(folder, actual);
+        return;
+    }
+    for (const auto& [file, text] : actual) {
+        const auto usual = defaults.find(file);
+        const bool stored = fs::exists(folder / file);
+        EXPECT_TRUE(stored || usual != defaults.end()) << "no " << file;
+        EXPECT_EQ(firstDifference(stored || usual == defaults.end() ? contentOf(folder / file) : usual->second, text),
+                  "")
+            << "in " << file;
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Hosts, SimulatedHost, testing::ValuesIn(hostNames()),
+                         [](const testing::TestParamInfo<std::string>& host) {
+                             std::string name = host.param;
+                             std::replace(name.begin(), name.end(), '-', '_');
+                             return name;
+                         });
+
+} // namespace
+} // namespace test
