@@ -160,8 +160,17 @@ CommandAnswer commandAnswer(const toml::node& node, const std::string& where) {
     return answer;
 }
 
+constexpr const char* pgrepPath = "/usr/bin/pgrep";
+constexpr int pgrepFoundNothing = 1; // its exit status
+
+bool isMissing(const toml::node& node) {
+    const auto* table = node.as_table();
+    return table != nullptr && table->size() == 1 && (*table)["missing"].value_or(false);
+}
+
 std::map<std::string, std::vector<CommandAnswer>> commands(Keys& hostKeys) {
     std::map<std::string, std::vector<CommandAnswer>> result;
+    result[pgrepPath] = {{{}, {}, pgrepFoundNothing}}; // part of every system
     const toml::node* node = hostKeys.find("commands");
     if (node == nullptr)
         return result;
@@ -172,6 +181,11 @@ std::map<std::string, std::vector<CommandAnswer>> commands(Keys& hostKeys) {
         if (std::find(commandPaths.begin(), commandPaths.end(), path) == commandPaths.end())
             refuse(value, path, "commands are /sbin/iscsiadm, /usr/bin/pgrep and /sbin/powermt");
         auto& answers = result[path];
+        answers.clear();
+        if (path == pgrepPath && isMissing(value)) {
+            result.erase(path);
+            continue;
+        }
         if (const auto* list = value.as_array()) {
             for (const auto& answer : *list)
                 answers.push_back(commandAnswer(answer, path));

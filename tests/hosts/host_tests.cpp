@@ -4,7 +4,8 @@
 //   expected.record   what was asked of the host
 // and, where a run does not end with "Test completed.\n", nothing on standard error and status 0,
 //   expected.output, expected.error, expected.status
-// With MORVANE_ACCEPT set in the environment the files are written instead of compared; review the difference.
+// With MORVANE_ACCEPT set in the environment the files are written instead of compared; review the
+// difference.
 #include "tests/hosts/log_comparison.hpp"
 #include "tests/support/process.hpp"
 
@@ -22,7 +23,8 @@ namespace fs = std::filesystem;
 
 using Texts = std::map<std::string, std::string>; // by the name of the file that holds the expected one
 
-const Texts defaults = {{"expected.output", "Test completed.\n"}, {"expected.error", ""}, {"expected.status", "0\n"}};
+const Texts defaults = {
+    {"expected.output", "Test completed.\n"}, {"expected.error", ""}, {"expected.status", "0\n"}};
 
 const fs::path hostsFolder = HOSTS_FOLDER;
 
@@ -36,6 +38,7 @@ std::vector<std::string> hostNames() {
 }
 
 Texts runOnHost(const std::string& name) {
+    ::setenv("LC_ALL", "C", 1); // what the shell's tools say and take for text
     const TemporaryDirectory scratch;
     const fs::path work = scratch.path() / "work";
     const fs::path record = scratch.path() / "record";
@@ -73,7 +76,8 @@ TEST_P(SimulatedHost, isReportedAsExpected) {
         const auto usual = defaults.find(file);
         const bool stored = fs::exists(folder / file);
         EXPECT_TRUE(stored || usual != defaults.end()) << "no " << file;
-        EXPECT_EQ(firstDifference(stored || usual == defaults.end() ? contentOf(folder / file) : usual->second, text),
+        EXPECT_EQ(firstDifference(
+                      stored || usual == defaults.end() ? contentOf(folder / file) : usual->second, text),
                   "")
             << "in " << file;
     }

@@ -28,11 +28,13 @@ bool isNumberCharacter(char c) {
     return std::isdigit(static_cast<unsigned char>(c)) != 0 || c == '.' || c == '-';
 }
 
-// Replaces what stands between `before` and `after` in the line, if that is there and not empty and all of it is
-// of the given characters. Texts may share a line, since some have no line end, so any place in it will do.
+// Replaces what stands between `before` and `after` in the line, if that is there and not empty and all of it
+// is of the given characters. Texts may share a line, since some have no line end, so any place in it will
+// do.
 void replaceBetween(std::string& line, std::string_view before, std::string_view after, bool (*isOfIt)(char),
                     std::string_view replacement) {
-    for (std::size_t start = line.find(before); start != std::string::npos; start = line.find(before, start + 1)) {
+    for (std::size_t start = line.find(before); start != std::string::npos;
+         start = line.find(before, start + 1)) {
         const std::size_t from = start + before.size();
         std::size_t to = from;
         while (to < line.size() && isOfIt(line[to]))
