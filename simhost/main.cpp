@@ -6,6 +6,7 @@
 #include "simhost/supervisor.hpp"
 #include "simhost/world.hpp"
 
+#include <chrono>
 #include <csignal>
 #include <cstring>
 #include <fcntl.h>
@@ -18,6 +19,7 @@
 #include <sys/prctl.h>
 #include <sys/syscall.h>
 #include <sys/wait.h>
+#include <thread>
 
 namespace simhost {
 namespace {
@@ -62,6 +64,15 @@ int shellStatus(int waitStatus) {
     return WIFEXITED(waitStatus) ? WEXITSTATUS(waitStatus) : 128 + WTERMSIG(waitStatus);
 }
 
+// Lets processes that the program left behind come to their own end, for a while: what they do is then the
+// same in every run. What is left after that ends with the host.
+void awaitOrphans() {
+    using namespace std::chrono_literals;
+    const auto deadline = std::chrono::steady_clock::now() + 1s;
+    while (::waitpid(-1, nullptr, WNOHANG) >= 0 && std::chrono::steady_clock::now() < deadline)
+        std::this_thread::sleep_for(1ms);
+}
+
 // The simulated host's first process: builds the host, runs the program in it and ends with its status. It is
 // not the program itself because the kernel spares a first process from signals that would end another.
 // It sends the number of its listener through `report`, and goes on when `proceed` is closed.
@@ -90,6 +101,7 @@ int firstProcess(const Host& host, const Arguments& arguments, FileDescriptor re
     while (check(::waitpid(-1, &status, 0), "waiting for the program") != program) {
         // a process that the program left behind
     }
+    awaitOrphans();
     return shellStatus(status);
 }
 
