@@ -393,7 +393,7 @@ TEST(SimHostLeavesTheRealMachine, withoutTheProgramsProcesses) {
     const fs::path mark = host.work() / "alive";
     EXPECT_EQ(host.shell("(while :; do touch alive; sleep 0.05; done) & sleep 0.2; ls; echo $$"),
               "alive\n2\n");
-    fs::remove(mark);
+    fs::remove(mark); // its maker ended with the host
     ::usleep(200000);
     EXPECT_FALSE(fs::exists(mark));
 }
