@@ -22,8 +22,9 @@ void fill(std::uint8_t (&field)[8], const Wwn& wwn) {
 template <typename Record>
 Bytes bytesOf(const std::vector<Record>& records) {
     Bytes bytes(records.size() * sizeof(Record), '\0');
-    if (!records.empty())
+    if (!records.empty()) {
         std::memcpy(bytes.data(), records.data(), bytes.size());
+    }
     return bytes;
 }
 
@@ -73,14 +74,16 @@ Bytes adapterFile(const VendorLibrary& library, const std::vector<Adapter>& adap
         record.ports = rangeFrom(firstPort, ports);
 
         const std::size_t firstDeviation = deviations.size();
-        for (const MappingDeviation& deviation : adapter.mapping)
+        for (const MappingDeviation& deviation : adapter.mapping) {
             deviations.push_back({deviation.status ? 1U : 0U, deviation.status.value_or(0),
                                   deviation.entries ? 1U : 0U, deviation.entries.value_or(0)});
+        }
         record.deviations = rangeFrom(firstDeviation, deviations);
 
         const std::size_t firstLun = luns.size();
-        for (const MappedLun& lun : adapter.luns)
+        for (const MappedLun& lun : adapter.luns) {
             luns.push_back(lunRecord(lun));
+        }
         record.luns = rangeFrom(firstLun, luns);
         adapterRecords.push_back(record);
     }

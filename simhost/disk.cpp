@@ -23,11 +23,13 @@ bool isInquiry(const ScsiRequest& request) {
 
 // The command as descriptions name it.
 int commandOf(const ScsiRequest& request) {
-    if (!isInquiry(request))
+    if (!isInquiry(request)) {
         return otherCommand;
+    }
     const bool vitalProductData = (request.cdb[1] & 1U) != 0;
-    if (vitalProductData)
+    if (vitalProductData) {
         return request.cdb[2];
+    }
     return request.cdb[2] == 0 ? standardInquiry : otherCommand; // a page code needs EVPD
 }
 
@@ -41,11 +43,13 @@ const Fault* DiskNode::faultFor(int command) {
     ++mTotal;
     const std::uint32_t count = ++mCount[command];
     for (const Fault& fault : mDisk->faults) {
-        if (fault.command && *fault.command != command)
+        if (fault.command && *fault.command != command) {
             continue;
+        }
         const std::uint32_t number = fault.command ? count : mTotal;
-        if (number >= fault.first && number <= fault.last)
+        if (number >= fault.first && number <= fault.last) {
             return &fault;
+        }
     }
     return nullptr;
 }
@@ -70,19 +74,23 @@ ScsiReply DiskNode::answer(const ScsiRequest& request) {
         reply.driverStatus = driverSense;
         reply.sense = illegalRequest(isInquiry(request) ? invalidFieldInCdb : invalidOperationCode);
     }
-    if (fault != nullptr && fault->data)
+    if (fault != nullptr && fault->data) {
         reply.data = *fault->data;
+    }
 
-    if (!mDisk->ignoresAllocationLength)
+    if (!mDisk->ignoresAllocationLength) {
         reply.data.resize(std::min(reply.data.size(), allocationLength(request)));
+    }
     reply.data.resize(std::min<std::size_t>(reply.data.size(), request.transferLength));
     reply.sense.resize(std::min<std::size_t>(reply.sense.size(), request.senseRoom));
     reply.senseLength = static_cast<std::uint8_t>(reply.sense.size());
     reply.resid = static_cast<std::int32_t>(request.transferLength - reply.data.size());
-    if (fault != nullptr && fault->senseLength)
+    if (fault != nullptr && fault->senseLength) {
         reply.senseLength = *fault->senseLength;
-    if (fault != nullptr && fault->resid)
+    }
+    if (fault != nullptr && fault->resid) {
         reply.resid = *fault->resid;
+    }
     return reply;
 }
 

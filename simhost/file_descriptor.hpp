@@ -12,8 +12,9 @@ namespace simhost {
 // Returns the call's result; throws std::system_error with `what` when it is negative.
 template <typename Result>
 Result check(Result result, const std::string& what) {
-    if (result < 0)
+    if (result < 0) {
         throw std::system_error(errno, std::generic_category(), what);
+    }
     return result;
 }
 
@@ -34,8 +35,9 @@ public:
     explicit operator bool() const { return mNumber >= 0; }
 
     void reset() {
-        if (mNumber >= 0)
+        if (mNumber >= 0) {
             ::close(std::exchange(mNumber, -1));
+        }
     }
 
 private:

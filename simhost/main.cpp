@@ -47,14 +47,15 @@ std::optional<Arguments> readArguments(int count, char** values) {
             arguments.program = values + i + 1;
             return arguments;
         }
-        if (value == "--record" && i + 1 < count)
+        if (value == "--record" && i + 1 < count) {
             arguments.record = values[++i];
-        else if (value == "--keep" && i + 1 < count)
+        } else if (value == "--keep" && i + 1 < count) {
             arguments.keep = values[++i];
-        else if (arguments.description.empty() && value.substr(0, 1) != "-")
+        } else if (arguments.description.empty() && value.substr(0, 1) != "-") {
             arguments.description = value;
-        else
+        } else {
             return std::nullopt;
+        }
     }
     return std::nullopt;
 }
@@ -69,8 +70,9 @@ int shellStatus(int waitStatus) {
 void awaitOrphans() {
     using namespace std::chrono_literals;
     const auto deadline = std::chrono::steady_clock::now() + 1s;
-    while (::waitpid(-1, nullptr, WNOHANG) >= 0 && std::chrono::steady_clock::now() < deadline)
+    while (::waitpid(-1, nullptr, WNOHANG) >= 0 && std::chrono::steady_clock::now() < deadline) {
         std::this_thread::sleep_for(1ms);
+    }
 }
 
 // The simulated host's first process: builds the host, runs the program in it and ends with its status. It is

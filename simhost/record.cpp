@@ -1,8 +1,7 @@
 #include "simhost/record.hpp"
 
-#include <array>
-#include <cstdio>
 #include <fcntl.h>
+#include <string_view>
 
 namespace simhost {
 
@@ -11,13 +10,14 @@ Record::Record(const std::filesystem::path& path)
 
 void Record::sgIo(const std::string& node, const SgRequest& request,
                   std::span<const std::uint8_t> cdb) const {
-    if (!mFile)
+    if (!mFile) {
         return;
+    }
     std::string line = "SG_IO " + node + " cdb=";
-    std::array<char, 3> digits{};
+    constexpr std::string_view digits = "0123456789abcdef";
     for (const std::uint8_t byte : cdb) {
-        std::snprintf(digits.data(), digits.size(), "%02x", unsigned{byte});
-        line += digits.data();
+        line += digits[byte >> 4U];
+        line += digits[byte & 0xfU];
     }
     line += " dxfer_len=" + std::to_string(request.transferLength) +
             " dxfer_direction=" + std::to_string(request.direction) +

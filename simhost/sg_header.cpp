@@ -10,19 +10,19 @@ namespace {
 // struct sg_io_hdr of a program whose pointers are `Pointer`.
 template <typename Pointer>
 struct Header {
-    std::int32_t interfaceId;
-    std::int32_t direction;
-    std::uint8_t cdbLength;
-    std::uint8_t senseRoom;
-    std::uint16_t scatterCount;
-    std::uint32_t transferLength;
-    Pointer data;
-    Pointer cdb;
-    Pointer sense;
-    std::uint32_t timeout;
-    std::uint32_t flags;
-    std::int32_t packetId;
-    Pointer user;
+    std::int32_t interfaceId = 0;
+    std::int32_t direction = 0;
+    std::uint8_t cdbLength = 0;
+    std::uint8_t senseRoom = 0;
+    std::uint16_t scatterCount = 0;
+    std::uint32_t transferLength = 0;
+    Pointer data = 0;
+    Pointer cdb = 0;
+    Pointer sense = 0;
+    std::uint32_t timeout = 0;
+    std::uint32_t flags = 0;
+    std::int32_t packetId = 0;
+    Pointer user = 0;
     SgOutcome outcome;
 };
 static_assert(sizeof(SgOutcome) == 20);
@@ -32,8 +32,9 @@ static_assert(sizeof(Header<std::uint64_t>) == 88 && offsetof(Header<std::uint64
 template <typename Pointer>
 std::optional<SgRequest> readHeader(pid_t process, RemoteAddress address) {
     Header<Pointer> header{};
-    if (!readMemory(process, address, &header, sizeof header))
+    if (!readMemory(process, address, &header, sizeof header)) {
         return std::nullopt;
+    }
     SgRequest request;
     request.interfaceId = header.interfaceId;
     request.direction = header.direction;

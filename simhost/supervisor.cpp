@@ -56,8 +56,9 @@ bool deliver(pid_t process, const SgRequest& request, ScsiReply& reply) {
     std::size_t parts = 0;
     ssize_t total = 0;
     const auto add = [&](void* from, RemoteAddress to, std::size_t size) {
-        if (size == 0)
+        if (size == 0) {
             return;
+        }
         local.at(parts) = {from, size};
         remote.at(parts) = {std::bit_cast<void*>(to), size};
         ++parts;
@@ -99,8 +100,9 @@ Supervisor::Supervisor(FileDescriptor listener, pid_t init, const std::vector<Di
     // One CPU hands over to the other side at once instead of waking a second one.
     ::ioctl(mListener.get(), SECCOMP_IOCTL_NOTIF_SET_FLAGS, SECCOMP_USER_NOTIF_FD_SYNC_WAKE_UP);
     for (const Disk& disk : disks) {
-        if (disk.open != Disk::Open::Succeeds)
+        if (disk.open != Disk::Open::Succeeds) {
             continue;
+        }
         for (const std::string& path : disk.nodes) {
             struct stat entry {};
             check(::stat(procPath(init, "/root" + path).c_str(), &entry), path);
@@ -113,8 +115,9 @@ Supervisor::Supervisor(FileDescriptor listener, pid_t init, const std::vector<Di
 Supervisor::Node* Supervisor::nodeOf(pid_t process, int descriptor) const {
     struct stat entry {};
     if (::stat(procPath(process, "/fd/" + std::to_string(descriptor)).c_str(), &entry) != 0 ||
-        entry.st_dev != mDevice)
+        entry.st_dev != mDevice) {
         return nullptr;
+    }
     const auto node = mNodes.find(entry.st_ino);
     return node == mNodes.end() ? nullptr : &node->second;
 }
@@ -130,37 +133,48 @@ int Supervisor::serve(const seccomp_notif& call, int initDescriptor) {
     const bool readable =
         request && (cdbLength == 0 || readMemory(process, request->cdb, bytes.data(), cdbLength));
     const std::span<const std::uint8_t> cdb(bytes.data(), cdbLength);
-    if (readable)
+    if (readable) {
         mRecord.sgIo(node == nullptr ? "-" : node->path, *request, cdb);
-    if (node == nullptr)
+    }
+    if (node == nullptr) {
         return ENOTTY;
-    if (!readable)
+    }
+    if (!readable) {
         return EFAULT;
-    if (request->interfaceId != 'S' || request->scatterCount != 0)
+    }
+    if (request->interfaceId != 'S' || request->scatterCount != 0) {
         return EINVAL;
-    if (request->cdbLength > longestCdb)
+    }
+    if (request->cdbLength > longestCdb) {
         return EMSGSIZE;
+    }
 
     ScsiReply reply = node->disk.answer({cdb, request->transferLength, request->senseRoom});
-    if (reply.delayMilliseconds != 0)
+    if (reply.delayMilliseconds != 0) {
         pause(reply.delayMilliseconds, initDescriptor);
-    if (reply.errorNumber != 0)
+    }
+    if (reply.errorNumber != 0) {
         return reply.errorNumber;
+    }
     return deliver(process, *request, reply) ? 0 : EFAULT;
 }
 
 void Supervisor::run(int initDescriptor) {
     std::array<pollfd, 2> sources = {{{mListener.get(), POLLIN, 0}, {initDescriptor, POLLIN, 0}}};
     for (;;) {
-        if (::poll(sources.data(), sources.size(), -1) < 0 && errno != EINTR)
+        if (::poll(sources.data(), sources.size(), -1) < 0 && errno != EINTR) {
             check(-1, "waiting for the program");
-        if (sources[1].revents != 0)
+        }
+        if (sources[1].revents != 0) {
             return;
-        if ((sources[0].revents & POLLIN) == 0)
+        }
+        if ((sources[0].revents & POLLIN) == 0) {
             continue;
+        }
         seccomp_notif call{};
-        if (::ioctl(mListener.get(), SECCOMP_IOCTL_NOTIF_RECV, &call) != 0)
+        if (::ioctl(mListener.get(), SECCOMP_IOCTL_NOTIF_RECV, &call) != 0) {
             continue; // the caller was killed meanwhile
+        }
         seccomp_notif_resp response{};
         response.id = call.id;
         response.error = -serve(call, initDescriptor);

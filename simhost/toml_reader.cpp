@@ -9,24 +9,27 @@ namespace simhost {
 namespace {
 
 int hexDigit(char c) {
-    if (c >= '0' && c <= '9')
+    if (c >= '0' && c <= '9') {
         return c - '0';
+    }
     const int lower = std::tolower(static_cast<unsigned char>(c));
     return lower >= 'a' && lower <= 'f' ? lower - 'a' + 10 : -1;
 }
 
 // The number as a placeholder "{n}", "{n:04}" or "{n:08x}" writes it; `format` is what follows "n".
 std::string numberAs(std::uint64_t number, std::string_view format, const std::string& where) {
-    if (format.empty())
+    if (format.empty()) {
         return std::to_string(number);
+    }
     unsigned width = 0;
     const char* end = format.data() + format.size();
     const auto [rest, error] = std::from_chars(format.data() + 1, end, width);
     const std::string_view kind(rest, static_cast<std::size_t>(end - rest));
     if (format.size() < 3 || format[0] != ':' || format[1] != '0' || error != std::errc() ||
-        (!kind.empty() && kind != "x"))
+        (!kind.empty() && kind != "x")) {
         throw DescriptionError(where + ": a placeholder is {n}, {n:04} or {n:08x}, not {n" +
                                std::string(format) + "}");
+    }
     std::ostringstream text;
     text << std::setfill('0') << std::setw(static_cast<int>(width)) << (kind.empty() ? std::dec : std::hex)
          << number;
@@ -39,8 +42,9 @@ std::string withNumber(const std::string& text, std::uint64_t number, const std:
     for (;;) {
         const std::size_t open = text.find("{n", at);
         const std::size_t close = open == std::string::npos ? open : text.find('}', open);
-        if (close == std::string::npos)
+        if (close == std::string::npos) {
             return result + text.substr(at);
+        }
         result += text.substr(at, open - at);
         result += numberAs(number, std::string_view(text).substr(open + 2, close - open - 2), where);
         at = close + 1;
@@ -48,14 +52,17 @@ std::string withNumber(const std::string& text, std::uint64_t number, const std:
 }
 
 void putNumber(toml::node& node, std::uint64_t number, const std::string& where) {
-    if (auto* text = node.as_string())
+    if (auto* text = node.as_string()) {
         *text = withNumber(text->get(), number, where);
-    else if (auto* table = node.as_table())
-        for (auto&& [key, value] : *table)
+    } else if (auto* table = node.as_table()) {
+        for (auto&& [key, value] : *table) {
             putNumber(value, number, where);
-    else if (auto* array = node.as_array())
-        for (auto& value : *array)
+        }
+    } else if (auto* array = node.as_array()) {
+        for (auto& value : *array) {
             putNumber(value, number, where);
+        }
+    }
 }
 
 } // namespace
@@ -64,11 +71,13 @@ Bytes bytesOfHex(std::string_view text, const std::string& where) {
     Bytes result;
     int high = -1;
     for (const char c : text) {
-        if (std::isspace(static_cast<unsigned char>(c)) != 0)
+        if (std::isspace(static_cast<unsigned char>(c)) != 0) {
             continue;
+        }
         const int digit = hexDigit(c);
-        if (digit < 0)
+        if (digit < 0) {
             throw DescriptionError(where + ": not a hex digit: '" + c + "'");
+        }
         if (high < 0) {
             high = digit;
         } else {
@@ -76,8 +85,9 @@ Bytes bytesOfHex(std::string_view text, const std::string& where) {
             high = -1;
         }
     }
-    if (high >= 0)
+    if (high >= 0) {
         throw DescriptionError(where + ": an odd number of hex digits");
+    }
     return result;
 }
 
@@ -87,16 +97,19 @@ void refuse(const toml::node& node, const std::string& where, const std::string&
 }
 
 Bytes bytesOf(const toml::node& node, const std::string& where) {
-    if (const auto* text = node.as_string())
+    if (const auto* text = node.as_string()) {
         return text->get();
+    }
     const auto* table = node.as_table();
-    if (table == nullptr)
+    if (table == nullptr) {
         refuse(node, where, "must be a string or { hex = \"…\" }");
+    }
     Keys keys(*table, where);
     auto bytes = keys.hex("hex");
     keys.refuseUnknown();
-    if (!bytes)
+    if (!bytes) {
         refuse(node, where, "must be a string or { hex = \"…\" }");
+    }
     return *bytes;
 }
 
@@ -104,14 +117,16 @@ std::vector<toml::table> unrolled(const toml::table& entry, const std::string& w
     Keys keys(entry, where);
     const auto count = keys.number("count");
     const std::uint64_t first = keys.number("first").value_or(0);
-    if (!count)
+    if (!count) {
         return {entry};
+    }
     toml::table pattern = entry;
     pattern.erase("count");
     pattern.erase("first");
     std::vector<toml::table> copies;
-    for (std::uint64_t n = first; n < first + *count; ++n)
+    for (std::uint64_t n = first; n < first + *count; ++n) {
         putNumber(copies.emplace_back(pattern), n, where);
+    }
     return copies;
 }
 
@@ -124,50 +139,59 @@ const toml::node* Keys::find(std::string_view key) {
 
 const toml::node& Keys::require(std::string_view key) {
     const toml::node* node = find(key);
-    if (node == nullptr)
+    if (node == nullptr) {
         refuse(mTable, mWhere, "has no \"" + std::string(key) + "\"");
+    }
     return *node;
 }
 
 std::optional<std::string> Keys::string(std::string_view key) {
     const toml::node* node = find(key);
-    if (node == nullptr)
+    if (node == nullptr) {
         return std::nullopt;
-    if (!node->is_string())
+    }
+    if (!node->is_string()) {
         refuse(*node, mWhere + "." + std::string(key), "must be a string");
+    }
     return node->as_string()->get();
 }
 
 std::optional<bool> Keys::boolean(std::string_view key) {
     const toml::node* node = find(key);
-    if (node == nullptr)
+    if (node == nullptr) {
         return std::nullopt;
-    if (!node->is_boolean())
+    }
+    if (!node->is_boolean()) {
         refuse(*node, mWhere + "." + std::string(key), "must be true or false");
+    }
     return node->as_boolean()->get();
 }
 
 std::optional<Bytes> Keys::bytes(std::string_view key) {
     const toml::node* node = find(key);
-    if (node == nullptr)
+    if (node == nullptr) {
         return std::nullopt;
+    }
     return bytesOf(*node, mWhere + "." + std::string(key));
 }
 
 std::optional<Bytes> Keys::hex(std::string_view key) {
     const auto text = string(key);
-    if (!text)
+    if (!text) {
         return std::nullopt;
+    }
     return bytesOfHex(*text, mWhere + "." + std::string(key));
 }
 
 std::optional<std::uint64_t> Keys::number(std::string_view key, std::uint64_t most) {
     const toml::node* node = find(key);
-    if (node == nullptr)
+    if (node == nullptr) {
         return std::nullopt;
+    }
     const auto* value = node->as_integer();
-    if (value == nullptr || value->get() < 0 || static_cast<std::uint64_t>(value->get()) > most)
+    if (value == nullptr || value->get() < 0 || static_cast<std::uint64_t>(value->get()) > most) {
         refuse(*node, mWhere + "." + std::string(key), "must be a number from 0 to " + std::to_string(most));
+    }
     return static_cast<std::uint64_t>(value->get());
 }
 
@@ -177,31 +201,37 @@ std::uint32_t Keys::number32(std::string_view key, std::uint32_t absent) {
 
 const toml::array* Keys::array(std::string_view key) {
     const toml::node* node = find(key);
-    if (node != nullptr && !node->is_array())
+    if (node != nullptr && !node->is_array()) {
         refuse(*node, mWhere + "." + std::string(key), "must be a list");
+    }
     return node == nullptr ? nullptr : node->as_array();
 }
 
 std::vector<toml::table> Keys::tables(std::string_view key) {
     std::vector<toml::table> result;
     const toml::array* entries = array(key);
-    if (entries == nullptr)
+    if (entries == nullptr) {
         return result;
+    }
     for (std::size_t i = 0; i < entries->size(); ++i) {
         const std::string where = std::string(key) + " " + std::to_string(i);
         const toml::node& entry = *entries->get(i);
-        if (!entry.is_table())
+        if (!entry.is_table()) {
             refuse(entry, where, "must be a table");
-        for (auto& copy : unrolled(*entry.as_table(), where))
+        }
+        for (auto& copy : unrolled(*entry.as_table(), where)) {
             result.push_back(std::move(copy));
+        }
     }
     return result;
 }
 
 void Keys::refuseUnknown() const {
-    for (auto&& [key, value] : mTable)
-        if (mKnown.find(key.str()) == mKnown.end())
+    for (auto&& [key, value] : mTable) {
+        if (mKnown.find(key.str()) == mKnown.end()) {
             refuse(value, mWhere, "unknown key \"" + std::string(key.str()) + "\"");
+        }
+    }
 }
 
 } // namespace simhost

@@ -40,8 +40,9 @@ void writeFile(const fs::path& path, const Bytes& content) {
     std::ofstream file(path, std::ios::binary | std::ios::trunc);
     file.write(content.data(), static_cast<std::streamsize>(content.size()));
     file.close();
-    if (!file)
+    if (!file) {
         throw std::system_error(errno, std::generic_category(), "writing " + path.string());
+    }
 }
 
 void makeSpecial(const fs::path& path, mode_t kind) {
@@ -54,8 +55,9 @@ void makeSpecial(const fs::path& path, mode_t kind) {
 void bindRealDirectories() {
     for (const fs::directory_entry& entry : fs::directory_iterator("/")) {
         const fs::path name = entry.path().filename();
-        if (name == "dev" || name == "proc" || name == "sys" || name == ".simhost")
+        if (name == "dev" || name == "proc" || name == "sys" || name == ".simhost") {
             continue;
+        }
         if (entry.is_symlink()) {
             fs::copy_symlink(entry.path(), buildRoot / name);
         } else if (entry.is_directory()) {
@@ -73,7 +75,7 @@ void bindRealDirectories() {
 fs::path coverDirectory(const fs::path& directory, const fs::path& layers) {
     std::string name = directory.relative_path().string();
     std::replace(name.begin(), name.end(), '/', '-');
-    const fs::path upper = layers / name / "changed";
+    fs::path upper = layers / name / "changed";
     const fs::path work = layers / name / "work";
     fs::create_directories(upper);
     fs::create_directories(work);
@@ -96,21 +98,25 @@ void makeDevices(const std::vector<Disk>& disks) {
     fs::create_symlink("/proc/self/fd/0", dev / "stdin");
     fs::create_symlink("/proc/self/fd/1", dev / "stdout");
     fs::create_symlink("/proc/self/fd/2", dev / "stderr");
-    for (const Disk& disk : disks)
+    for (const Disk& disk : disks) {
         for (const std::string& node : disk.nodes) {
-            if (disk.open == Disk::Open::NoEntry)
+            if (disk.open == Disk::Open::NoEntry) {
                 continue;
+            }
             const fs::path path = inRoot(node);
-            if (fs::exists(fs::symlink_status(path)))
+            if (fs::exists(fs::symlink_status(path))) {
                 throw std::system_error(EEXIST, std::generic_category(), node);
+            }
             fs::create_directories(path.parent_path());
-            if (disk.open == Disk::Open::Succeeds)
+            if (disk.open == Disk::Open::Succeeds) {
                 makeSpecial(path, S_IFREG); // commands to it are answered before the kernel looks at its kind
-            else if (disk.open == Disk::Open::NoDevice)
+            } else if (disk.open == Disk::Open::NoDevice) {
                 makeSpecial(path, S_IFSOCK); // open() fails as for a node without a driver
-            else
+            } else {
                 fs::create_symlink(path.filename(), path);
+            }
         }
+    }
 }
 
 void makeBlockEntry(const fs::path& directory, const BlockEntry& entry) {
@@ -144,16 +150,21 @@ void makeBlockEntry(const fs::path& directory, const BlockEntry& entry) {
 void makeSysBlock(const std::vector<BlockEntry>& entries) {
     const fs::path directory = buildRoot / "sys/block";
     fs::create_directories(directory);
-    if (entries.empty())
+    if (entries.empty()) {
         return;
-    for (const BlockEntry& entry : entries)
+    }
+    for (const BlockEntry& entry : entries) {
         makeBlockEntry(directory, entry);
-    if (fs::directory_iterator(directory)->path().filename() == entries.front().name)
+    }
+    if (fs::directory_iterator(directory)->path().filename() == entries.front().name) {
         return;
+    }
     fs::remove_all(directory);
     fs::create_directory(directory);
-    for (auto entry = entries.rbegin(); entry != entries.rend(); ++entry)
-        makeBlockEntry(directory, *entry);
+    const std::vector<BlockEntry> reversed(entries.rbegin(), entries.rend());
+    for (const BlockEntry& entry : reversed) {
+        makeBlockEntry(directory, entry);
+    }
 }
 
 void makeFile(const fs::path& path, const File& file, const fs::path& placeHolder) {
@@ -161,24 +172,28 @@ void makeFile(const fs::path& path, const File& file, const fs::path& placeHolde
     const bool inProc = path.string().rfind("/proc/", 0) == 0; // covered, as it cannot be removed
     if (!inProc) {
         fs::remove(target);
-        if (file.kind == File::Kind::Missing)
+        if (file.kind == File::Kind::Missing) {
             return;
+        }
         fs::create_directories(target.parent_path());
     }
     switch (file.kind) {
     case File::Kind::Content:
         writeFile(inProc ? placeHolder : target, file.content);
-        if (inProc)
+        if (inProc) {
             bind(placeHolder, target);
+        }
         return;
     case File::Kind::OpenError:
         makeSpecial(inProc ? placeHolder : target, S_IFSOCK); // open() fails with ENXIO
-        if (inProc)
+        if (inProc) {
             bind(placeHolder, target);
+        }
         return;
     case File::Kind::ReadError:
-        if (!inProc)
+        if (!inProc) {
             writeFile(target, {});
+        }
         bind(buildRoot / "proc/1/mem", target); // address 0 of the first process: EIO
         return;
     case File::Kind::Link:
@@ -222,10 +237,11 @@ void copyTree(const fs::path& from, const fs::path& to) {
             continue;
         }
         fs::remove(target);
-        if (type == fs::file_type::symlink)
+        if (type == fs::file_type::symlink) {
             fs::copy_symlink(entry.path(), target);
-        else if (type == fs::file_type::regular)
+        } else if (type == fs::file_type::regular) {
             fs::copy_file(entry.path(), target);
+        }
     }
 }
 
@@ -241,45 +257,57 @@ void enterWorld(const Host& host, const Helpers& helpers, const fs::path& record
     const fs::path layers = own / "layers";
     std::map<fs::path, fs::path> covered; // directory → its changed files
     covered["/etc"];
-    for (const char* command : commandPaths)
+    for (const char* command : commandPaths) {
         covered[fs::canonical(fs::path(command).parent_path())];
-    for (auto& [directory, changed] : covered)
+    }
+    for (auto& [directory, changed] : covered) {
         changed = coverDirectory(directory, layers);
+    }
 
     makeDevices(host.disks);
     fs::create_directory(buildRoot / "sys");
-    if (host.sysBlock)
+    if (host.sysBlock) {
         makeSysBlock(*host.sysBlock);
+    }
     fs::create_directory(buildRoot / "proc");
     mountAt("proc", buildRoot / "proc", "proc", 0);
 
     fs::remove(inRoot("/etc/hba.conf"));
     fs::remove(inRoot("/etc/iscsi/initiatorname.iscsi"));
-    for (const auto& [path, file] : host.files)
+    for (const auto& [path, file] : host.files) {
         makeFile(path, file, own / "partitions");
+    }
 
-    for (const char* command : commandPaths)
+    for (const char* command : commandPaths) {
         fs::remove(inRoot(command));
-    for (const auto& [path, answers] : host.commands)
+    }
+    for (const auto& [path, answers] : host.commands) {
         makeCommand(path, answers, own / "commands" / fs::path(path).filename());
+    }
     bindFile(helpers.command, own / "command");
 
     if (host.vendorLibrary) {
         writeFile(inRoot(adapterFilePath), adapterFile(*host.vendorLibrary, host.adapters));
         bindFile(helpers.vendorLibrary64, own / "lib/x86_64-linux-gnu/libsimhba.so");
-        for (const char* folder : {"lib32", "lib/i386-linux-gnu"}) // as multilib and i386 packages have it
+        for (const char* folder : {"lib32", "lib/i386-linux-gnu"}) { // as multilib and i386 packages have it
             bindFile(helpers.vendorLibrary32, own / folder / "libsimhba.so");
+        }
     }
-    if (!record.empty())
+    if (!record.empty()) {
         bindFile(record, own / "record");
+    }
     if (!keep.empty()) {
-        for (const char* part : {"dev", "sys", ".simhost/commands"})
-            if (fs::exists(buildRoot / part))
+        for (const char* part : {"dev", "sys", ".simhost/commands"}) {
+            if (fs::exists(buildRoot / part)) {
                 copyTree(buildRoot / part, keep / fs::path(part).filename());
-        for (const auto& [directory, changed] : covered)
+            }
+        }
+        for (const auto& [directory, changed] : covered) {
             copyTree(changed, keep / directory.relative_path());
-        if (host.vendorLibrary)
+        }
+        if (host.vendorLibrary) {
             fs::copy_file(inRoot(adapterFilePath), keep / "adapters", fs::copy_options::overwrite_existing);
+        }
     }
 
     check(::sethostname(host.hostName.data(), host.hostName.size()), "setting the host name");

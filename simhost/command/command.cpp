@@ -18,8 +18,9 @@ long numberIn(const std::string& path) {
     char text[32] = {};
     const int file = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
     if (file >= 0) {
-        if (::read(file, text, sizeof text - 1) < 0)
+        if (::read(file, text, sizeof text - 1) < 0) {
             text[0] = '\0';
+        }
         ::close(file);
     }
     return std::strtol(text, nullptr, 10);
@@ -39,34 +40,40 @@ long countCall(const std::string& path) {
 void print(const std::string& path, int to) {
     const int file = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);
     char bytes[65536];
-    for (ssize_t size = 0; (size = ::read(file, bytes, sizeof bytes)) > 0;)
+    for (ssize_t size = 0; (size = ::read(file, bytes, sizeof bytes)) > 0;) {
         for (ssize_t done = 0; done < size;) {
             const ssize_t written = ::write(to, bytes + done, static_cast<size_t>(size - done));
-            if (written < 0)
+            if (written < 0) {
                 return;
+            }
             done += written;
         }
+    }
     ::close(file);
 }
 
 void record(char** arguments) {
     const int file = ::open((std::string(ownFolder) + "record").c_str(), O_WRONLY | O_APPEND | O_CLOEXEC);
-    if (file < 0)
+    if (file < 0) {
         return; // nobody asked for one
+    }
     std::string line = "run";
-    for (; *arguments != nullptr; ++arguments)
+    for (; *arguments != nullptr; ++arguments) {
         line += std::string(" ") + *arguments;
+    }
     line += "\n";
-    if (::write(file, line.data(), line.size()) < 0)
+    if (::write(file, line.data(), line.size()) < 0) {
         std::perror("simhost: writing the record");
+    }
     ::close(file);
 }
 
 } // namespace
 
 int main(int argumentCount, char** arguments) {
-    if (argumentCount < 1)
+    if (argumentCount < 1) {
         return 2;
+    }
     record(arguments);
     const char* slash = std::strrchr(arguments[0], '/');
     const std::string name = slash == nullptr ? arguments[0] : slash + 1;

@@ -31,17 +31,20 @@ struct Adapters {
 Adapters gAdapters; // one library, one host
 
 bool mapAdapters() {
-    if (gAdapters.mapped != MAP_FAILED)
+    if (gAdapters.mapped != MAP_FAILED) {
         return true;
+    }
     const int file = ::open(adapterFilePath, O_RDONLY | O_CLOEXEC);
     struct stat entry {};
-    if (file < 0 || ::fstat(file, &entry) != 0)
+    if (file < 0 || ::fstat(file, &entry) != 0) {
         return false;
+    }
     gAdapters.size = static_cast<std::size_t>(entry.st_size);
     gAdapters.mapped = ::mmap(nullptr, gAdapters.size, PROT_READ | PROT_WRITE, MAP_PRIVATE, file, 0);
     ::close(file);
-    if (gAdapters.mapped == MAP_FAILED)
+    if (gAdapters.mapped == MAP_FAILED) {
         return false;
+    }
     auto* header = static_cast<AdapterFileHeader*>(gAdapters.mapped);
     gAdapters.header = *header;
     void* next = header + 1;
@@ -75,8 +78,9 @@ HBA_STATUS loadLibrary() {
 }
 
 HBA_STATUS freeLibrary() {
-    if (gAdapters.mapped != MAP_FAILED)
+    if (gAdapters.mapped != MAP_FAILED) {
         ::munmap(gAdapters.mapped, gAdapters.size);
+    }
     gAdapters = Adapters();
     return HBA_STATUS_OK;
 }
@@ -86,18 +90,22 @@ HBA_UINT32 getNumberOfAdapters() {
 }
 
 HBA_STATUS getAdapterName(HBA_UINT32 index, char* name) {
-    if (index >= gAdapters.header.adapters)
+    if (index >= gAdapters.header.adapters) {
         return HBA_STATUS_ERROR_ILLEGAL_INDEX;
+    }
     const AdapterFileAdapter& adapter = gAdapters.adapters[index];
-    if (adapter.nameStatus == HBA_STATUS_OK)
+    if (adapter.nameStatus == HBA_STATUS_OK) {
         std::memcpy(name, adapter.name, sizeof adapter.name);
+    }
     return adapter.nameStatus;
 }
 
 HBA_HANDLE openAdapter(char* name) {
-    for (HBA_UINT32 i = 0; i < gAdapters.header.adapters; ++i)
-        if (std::strncmp(name, gAdapters.adapters[i].name, sizeof gAdapters.adapters[i].name) == 0)
+    for (HBA_UINT32 i = 0; i < gAdapters.header.adapters; ++i) {
+        if (std::strncmp(name, gAdapters.adapters[i].name, sizeof gAdapters.adapters[i].name) == 0) {
             return gAdapters.adapters[i].opens != 0 ? i + 1 : HBA_HANDLE_INVALID;
+        }
+    }
     return HBA_HANDLE_INVALID;
 }
 
@@ -105,8 +113,9 @@ void closeAdapter(HBA_HANDLE /*handle*/) {}
 
 HBA_STATUS getAdapterAttributes(HBA_HANDLE handle, HBA_ADAPTERATTRIBUTES* attributes) {
     const AdapterFileAdapter* adapter = adapterOf(handle);
-    if (adapter == nullptr)
+    if (adapter == nullptr) {
         return HBA_STATUS_ERROR_INVALID_HANDLE;
+    }
     std::memset(attributes, 0, sizeof *attributes);
     std::memcpy(attributes->Manufacturer, adapter->manufacturer, sizeof attributes->Manufacturer);
     std::memcpy(attributes->Model, adapter->model, sizeof attributes->Model);
@@ -117,10 +126,12 @@ HBA_STATUS getAdapterAttributes(HBA_HANDLE handle, HBA_ADAPTERATTRIBUTES* attrib
 
 HBA_STATUS getAdapterPortAttributes(HBA_HANDLE handle, HBA_UINT32 index, HBA_PORTATTRIBUTES* attributes) {
     const AdapterFileAdapter* adapter = adapterOf(handle);
-    if (adapter == nullptr)
+    if (adapter == nullptr) {
         return HBA_STATUS_ERROR_INVALID_HANDLE;
-    if (index >= adapter->ports.count)
+    }
+    if (index >= adapter->ports.count) {
         return HBA_STATUS_ERROR_ILLEGAL_INDEX;
+    }
     const AdapterFilePort& port = gAdapters.ports[adapter->ports.first + index];
     std::memset(attributes, 0, sizeof *attributes);
     attributes->NodeWWN = wwnOf(adapter->nodeWwn);
@@ -142,21 +153,25 @@ void putEntry(HBA_FCPSCSIENTRY& entry, const AdapterFileLun& lun) {
 
 HBA_STATUS getFcpTargetMapping(HBA_HANDLE handle, HBA_FCPTARGETMAPPING* mapping) {
     AdapterFileAdapter* adapter = adapterOf(handle);
-    if (adapter == nullptr)
+    if (adapter == nullptr) {
         return HBA_STATUS_ERROR_INVALID_HANDLE;
+    }
     const HBA_UINT32 room = mapping->NumberOfEntries;
     const HBA_UINT32 real = adapter->luns.count;
-    for (HBA_UINT32 i = 0; i < std::min(room, real); ++i)
+    for (HBA_UINT32 i = 0; i < std::min(room, real); ++i) {
         putEntry(mapping->entry[i], gAdapters.luns[adapter->luns.first + i]);
+    }
     mapping->NumberOfEntries = real;
     HBA_STATUS status = real > room ? HBA_STATUS_ERROR_MORE_DATA : HBA_STATUS_OK;
     if (adapter->deviations.count != 0) {
         const HBA_UINT32 call = std::min(adapter->mappingCalls, adapter->deviations.count - 1);
         const AdapterFileDeviation& deviation = gAdapters.deviations[adapter->deviations.first + call];
-        if (deviation.hasEntries != 0)
+        if (deviation.hasEntries != 0) {
             mapping->NumberOfEntries = deviation.entries;
-        if (deviation.hasStatus != 0)
+        }
+        if (deviation.hasStatus != 0) {
             status = deviation.status;
+        }
     }
     ++adapter->mappingCalls;
     return status;
@@ -165,20 +180,23 @@ HBA_STATUS getFcpTargetMapping(HBA_HANDLE handle, HBA_FCPTARGETMAPPING* mapping)
 } // namespace
 
 // The one entry that the HBA API library looks up.
-extern "C" __attribute__((visibility("default"))) HBA_STATUS HBA_RegisterLibrary(HBA_ENTRYPOINTS* entries) {
-    if (!mapAdapters())
+extern "C" __attribute__((visibility("default"))) HBA_STATUS
+HBA_RegisterLibrary(HBA_ENTRYPOINTS* functionTable) {
+    if (!mapAdapters()) {
         return HBA_STATUS_ERROR;
-    if (gAdapters.header.registerStatus != HBA_STATUS_OK)
+    }
+    if (gAdapters.header.registerStatus != HBA_STATUS_OK) {
         return gAdapters.header.registerStatus;
-    entries->GetVersionHandler = getVersion;
-    entries->LoadLibraryHandler = loadLibrary;
-    entries->FreeLibraryHandler = freeLibrary;
-    entries->GetNumberOfAdaptersHandler = getNumberOfAdapters;
-    entries->GetAdapterNameHandler = getAdapterName;
-    entries->OpenAdapterHandler = openAdapter;
-    entries->CloseAdapterHandler = closeAdapter;
-    entries->GetAdapterAttributesHandler = getAdapterAttributes;
-    entries->GetAdapterPortAttributesHandler = getAdapterPortAttributes;
-    entries->GetFcpTargetMappingHandler = getFcpTargetMapping;
+    }
+    functionTable->GetVersionHandler = getVersion;
+    functionTable->LoadLibraryHandler = loadLibrary;
+    functionTable->FreeLibraryHandler = freeLibrary;
+    functionTable->GetNumberOfAdaptersHandler = getNumberOfAdapters;
+    functionTable->GetAdapterNameHandler = getAdapterName;
+    functionTable->OpenAdapterHandler = openAdapter;
+    functionTable->CloseAdapterHandler = closeAdapter;
+    functionTable->GetAdapterAttributesHandler = getAdapterAttributes;
+    functionTable->GetAdapterPortAttributesHandler = getAdapterPortAttributes;
+    functionTable->GetFcpTargetMappingHandler = getFcpTargetMapping;
     return HBA_STATUS_OK;
 }

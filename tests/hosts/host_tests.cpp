@@ -31,9 +31,11 @@ const fs::path hostsFolder = HOSTS_FOLDER;
 
 std::vector<std::string> hostNames() {
     std::vector<std::string> names;
-    for (const auto& entry : fs::directory_iterator(hostsFolder))
-        if (fs::exists(entry.path() / "host.toml"))
+    for (const auto& entry : fs::directory_iterator(hostsFolder)) {
+        if (fs::exists(entry.path() / "host.toml")) {
             names.push_back(entry.path().filename());
+        }
+    }
     std::sort(names.begin(), names.end());
     return names;
 }
@@ -44,8 +46,9 @@ std::string commandsFirst(const std::string& record) {
     std::istringstream lines(record);
     std::string commands;
     std::string others;
-    for (std::string line; std::getline(lines, line);)
+    for (std::string line; std::getline(lines, line);) {
         (line.rfind("run ", 0) == 0 ? commands : others) += line + "\n";
+    }
     return commands + others;
 }
 
@@ -68,10 +71,11 @@ Texts runOnHost(const std::string& name) {
 void accept(const fs::path& folder, const Texts& texts) {
     for (const auto& [file, text] : texts) {
         const auto usual = defaults.find(file);
-        if (usual != defaults.end() && usual->second == text)
+        if (usual != defaults.end() && usual->second == text) {
             fs::remove(folder / file);
-        else
+        } else {
             std::ofstream(folder / file, std::ios::binary) << text;
+        }
     }
 }
 

@@ -1,9 +1,7 @@
 #include "tests/hosts/log_comparison.hpp"
 
 #include <algorithm>
-#include <array>
 #include <cctype>
-#include <cstdio>
 #include <string_view>
 #include <vector>
 
@@ -37,10 +35,12 @@ void replaceBetween(std::string& line, std::string_view before, std::string_view
          start = line.find(before, start + 1)) {
         const std::size_t from = start + before.size();
         std::size_t to = from;
-        while (to < line.size() && isOfIt(line[to]))
+        while (to < line.size() && isOfIt(line[to])) {
             ++to;
-        if (to > from && std::string_view(line).substr(to, after.size()) == after)
+        }
+        if (to > from && std::string_view(line).substr(to, after.size()) == after) {
             line.replace(from, to - from, replacement);
+        }
     }
 }
 
@@ -55,16 +55,20 @@ void replaceTraceLine(std::string& line, std::string_view verb, bool keepsScsiEx
     for (std::size_t at = line.find(start); at != std::string::npos; at = line.find(start, at + 1)) {
         const std::size_t name = at + start.size();
         const std::size_t word = line.find(" Line ", name);
-        if (word == std::string::npos)
+        if (word == std::string::npos) {
             return;
-        if (keepsScsiExit && line.compare(name, word - name, "doScsiIo") == 0)
+        }
+        if (keepsScsiExit && line.compare(name, word - name, "doScsiIo") == 0) {
             continue;
+        }
         const std::size_t from = word + std::string_view(" Line ").size();
         std::size_t to = from;
-        while (to < line.size() && std::isdigit(static_cast<unsigned char>(line[to])) != 0)
+        while (to < line.size() && std::isdigit(static_cast<unsigned char>(line[to])) != 0) {
             ++to;
-        if (to > from)
+        }
+        if (to > from) {
             line.replace(from, to - from, "#");
+        }
     }
 }
 
@@ -91,9 +95,10 @@ std::string visible(std::string_view line) {
             result += c;
             continue;
         }
-        std::array<char, 5> escape{};
-        std::snprintf(escape.data(), escape.size(), "\\x%02x", unsigned{byte});
-        result += escape.data();
+        constexpr std::string_view digits = "0123456789abcdef";
+        result += "\\x";
+        result += digits[byte >> 4U];
+        result += digits[byte & 0xfU];
     }
     return result;
 }
@@ -102,8 +107,9 @@ std::string excerpt(const std::vector<std::string_view>& lines, std::size_t plac
     constexpr std::size_t context = 6;
     std::string text;
     const std::size_t end = std::min(lines.size(), place + context);
-    for (std::size_t i = place < context ? 0 : place - context; i < end; ++i)
+    for (std::size_t i = place < context ? 0 : place - context; i < end; ++i) {
         text += (i == place ? "  > " : "    ") + visible(lines[i]) + "\n";
+    }
     return lines.size() <= place ? text + "  > (end)\n" : text;
 }
 
@@ -111,22 +117,26 @@ std::string excerpt(const std::vector<std::string_view>& lines, std::size_t plac
 
 std::string normalised(const std::string& log) {
     std::string result;
-    for (const std::string_view line : linesOf(log))
+    for (const std::string_view line : linesOf(log)) {
         result += normalisedLine(line) + "\n";
-    if (!log.empty() && log.back() != '\n')
+    }
+    if (!log.empty() && log.back() != '\n') {
         result.pop_back();
+    }
     return result;
 }
 
 std::string firstDifference(const std::string& expected, const std::string& actual) {
-    if (expected == actual)
+    if (expected == actual) {
         return "";
+    }
     const auto expectedLines = linesOf(expected);
     const auto actualLines = linesOf(actual);
     std::size_t place = 0;
     while (place < expectedLines.size() && place < actualLines.size() &&
-           expectedLines[place] == actualLines[place])
+           expectedLines[place] == actualLines[place]) {
         ++place;
+    }
     return "first difference in line " + std::to_string(place + 1) + "\nexpected:\n" +
            excerpt(expectedLines, place) + "actual:\n" + excerpt(actualLines, place);
 }

@@ -9,8 +9,9 @@
 namespace {
 
 void printWwn(const HBA_WWN& wwn) {
-    for (const HBA_UINT8 byte : wwn.wwn)
+    for (const HBA_UINT8 byte : wwn.wwn) {
         std::printf("%02x", unsigned{byte});
+    }
 }
 
 constexpr HBA_UINT32 room = 8; // entries that the mapping buffer holds
@@ -24,8 +25,9 @@ void printMapping(HBA_HANDLE handle, HBA_UINT32 asked) {
     std::printf("  mapping of %u: status %u, %u entries\n", asked, status, mapping->NumberOfEntries);
     for (HBA_UINT32 i = 0; i < room; ++i) {
         const HBA_FCPSCSIENTRY& entry = mapping->entry[i];
-        if (entry.ScsiId.OSDeviceName[0] == '\0')
+        if (entry.ScsiId.OSDeviceName[0] == '\0') {
             continue;
+        }
         std::printf("    %s bus %u target %u lun %u fcid %x fcplun %llx ", entry.ScsiId.OSDeviceName,
                     entry.ScsiId.ScsiBusNumber, entry.ScsiId.ScsiTargetNumber, entry.ScsiId.ScsiOSLun,
                     entry.FcpId.FcId, entry.FcpId.FcpLun);
@@ -67,7 +69,8 @@ void printAdapter(HBA_UINT32 index) {
 int main() {
     std::printf("load: status %u\n", HBA_LoadLibrary());
     const HBA_UINT32 count = HBA_GetNumberOfAdapters();
-    for (HBA_UINT32 i = 0; i < count; ++i)
+    for (HBA_UINT32 i = 0; i < count; ++i) {
         printAdapter(i);
+    }
     std::printf("free: status %u\n", HBA_FreeLibrary());
 }

@@ -16,18 +16,19 @@ constexpr unsigned char untouched = 0xee; // what the buffers hold before the co
 
 std::string hexOf(const unsigned char* bytes, std::size_t count) {
     std::string text;
-    char digits[3];
+    constexpr char digits[] = "0123456789abcdef";
     for (std::size_t i = 0; i < count; ++i) {
-        std::snprintf(digits, sizeof digits, "%02x", unsigned{bytes[i]});
-        text += digits;
+        text += digits[bytes[i] >> 4U];
+        text += digits[bytes[i] & 0xfU];
     }
     return text;
 }
 
 // How many bytes from the start were written.
 std::size_t writtenOf(const unsigned char* bytes, std::size_t size) {
-    while (size > 0 && bytes[size - 1] == untouched)
+    while (size > 0 && bytes[size - 1] == untouched) {
         --size;
+    }
     return size;
 }
 
@@ -39,8 +40,9 @@ void send(const char* node, const std::string& cdbText) {
     }
     unsigned char cdb[32] = {};
     const std::size_t length = cdbText.size() / 2;
-    for (std::size_t i = 0; i < length; ++i)
+    for (std::size_t i = 0; i < length; ++i) {
         cdb[i] = static_cast<unsigned char>(std::strtoul(cdbText.substr(2 * i, 2).c_str(), nullptr, 16));
+    }
     unsigned char data[64];
     unsigned char sense[32];
     std::memset(data, untouched, sizeof data);
@@ -55,19 +57,21 @@ void send(const char* node, const std::string& cdbText) {
     header.cmdp = cdb;
     header.sbp = sense;
     header.timeout = 1500;
-    if (::ioctl(file, SG_IO, &header) < 0)
+    if (::ioctl(file, SG_IO, &header) < 0) {
         std::printf("%s: ioctl: %s\n", node, std::strerror(errno));
-    else
+    } else {
         std::printf("%s: status %d host %d driver %d resid %d sense %d:%s data %s\n", node, header.status,
                     header.host_status, header.driver_status, header.resid, header.sb_len_wr,
                     hexOf(sense, writtenOf(sense, sizeof sense)).c_str(),
                     hexOf(data, writtenOf(data, sizeof data)).c_str());
+    }
     ::close(file);
 }
 
 } // namespace
 
 int main(int argumentCount, char** arguments) {
-    for (int i = 1; i + 1 < argumentCount; i += 2)
+    for (int i = 1; i + 1 < argumentCount; i += 2) {
         send(arguments[i], arguments[i + 1]);
+    }
 }

@@ -24,8 +24,9 @@ constexpr int cannotStart = 126;
     const int out = ::open(output.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
     const int err = ::open(error.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
     if (::dup2(in, STDIN_FILENO) < 0 || ::dup2(out, STDOUT_FILENO) < 0 || ::dup2(err, STDERR_FILENO) < 0 ||
-        ::chdir(directory.c_str()) != 0)
+        ::chdir(directory.c_str()) != 0) {
         ::_exit(cannotStart);
+    }
     ::close(in);
     ::close(out);
     ::close(err);
@@ -39,22 +40,27 @@ ProcessResult runProcess(const std::vector<std::string>& arguments, const std::f
     std::vector<std::string> copies = arguments;
     std::vector<char*> pointers;
     pointers.reserve(copies.size() + 1);
-    for (std::string& copy : copies)
+    for (std::string& copy : copies) {
         pointers.push_back(copy.data());
+    }
     pointers.push_back(nullptr);
 
     const TemporaryDirectory streams;
     const std::filesystem::path output = streams.path() / "output";
     const std::filesystem::path error = streams.path() / "error";
     const pid_t child = ::fork();
-    if (child < 0)
+    if (child < 0) {
         throw std::system_error(errno, std::generic_category(), "fork");
-    if (child == 0)
+    }
+    if (child == 0) {
         become(pointers, directory, output, error);
+    }
     int status = 0;
-    while (::waitpid(child, &status, 0) < 0)
-        if (errno != EINTR)
+    while (::waitpid(child, &status, 0) < 0) {
+        if (errno != EINTR) {
             throw std::system_error(errno, std::generic_category(), "waitpid");
+        }
+    }
     ProcessResult result;
     result.status = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
     result.output = contentOf(output);
@@ -64,8 +70,9 @@ ProcessResult runProcess(const std::vector<std::string>& arguments, const std::f
 
 TemporaryDirectory::TemporaryDirectory() {
     std::string pattern = (std::filesystem::temp_directory_path() / "morvane-test-XXXXXX").string();
-    if (::mkdtemp(pattern.data()) == nullptr)
+    if (::mkdtemp(pattern.data()) == nullptr) {
         throw std::system_error(errno, std::generic_category(), pattern);
+    }
     mPath = pattern;
 }
 
