@@ -1,0 +1,105 @@
+#!/usr/bin/env python3
+"""Checks every excerpt of the documents against a run of the program on the simulated host that it names.
+
+usage: quoted_lines.py SIMHOST MORVANE DOCUMENT...
+
+An excerpt is a fenced block (Markdown) or a .Bd display (manual page) behind one of these marks, which stands on the
+fence or in a comment on the line before the display:
+
+    log HOST            lines of the log on tests/hosts/HOST, in this order; others may stand between them
+    log HOST prefix     likewise, but the lines may go on
+    log HOST nobody     likewise, of a run as an unprivileged user
+    output HOST         the whole standard output
+
+Blanks at the ends of lines do not count.
+"""
+
+import re
+import shutil
+import subprocess
+import sys
+import tempfile
+from functools import cache
+from pathlib import Path
+from typing import Iterator, NamedTuple
+
+HOSTS = Path(__file__).resolve().parents[1] / "hosts"
+AS_NOBODY = ["setpriv", "--reuid=65534", "--regid=65534", "--clear-groups"]
+
+
+class Excerpt(NamedTuple):
+    place: str
+    kind: str
+    host: str
+    options: tuple[str, ...]
+    lines: list[str]
+
+
+def markdown_excerpts(path: Path) -> Iterator[Excerpt]:
+    text = path.read_text()
+    for match in re.finditer(r"^```(log|output) (\S+)(.*)\n((?:.*\n)*?)```$", text, re.MULTILINE):
+        line = text.count("\n", 0, match.start()) + 1
+        yield Excerpt(f"{path.name}:{line}", match[1], match[2], tuple(match[3].split()), match[4].splitlines())
+
+
+def unescaped(line: str) -> str:
+    for escape, character in ((r"\-", "-"), (r"\(aq", "'"), (r"\&", ""), (r"\e", "\\")):
+        line = line.replace(escape, character)
+    return line
+
+
+def manual_excerpts(path: Path) -> Iterator[Excerpt]:
+    text = path.read_text()
+    for match in re.finditer(r'^\.\\" (log|output) (\S+)(.*)\n\.Bd .*\n((?:.*\n)*?)\.Ed$', text, re.MULTILINE):
+        line = text.count("\n", 0, match.start()) + 1
+        lines = [unescaped(quoted) for quoted in match[4].splitlines()]
+        yield Excerpt(f"{path.name}:{line}", match[1], match[2], tuple(match[3].split()), lines)
+
+
+@cache
+def run(simhost: Path, morvane: Path, host: str, as_nobody: bool) -> tuple[list[str], list[str]]:
+    """The lines of the log and of standard output of one run."""
+    with tempfile.TemporaryDirectory() as name:
+        work = Path(name)
+        work.chmod(0o777)
+        program = Path(shutil.copy(morvane, work)) # where an unprivileged user finds it too
+        command = [simhost, HOSTS / host / "host.toml", "--", *(AS_NOBODY if as_nobody else []), program]
+        output = subprocess.run(command, cwd=work, stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, check=False).stdout
+        log = (work / "MorvaneLogs" / "Morvane.log").read_bytes()
+    return log.decode(errors="replace").split("\n"), output.decode(errors="replace").split("\n")
+
+
+def complaint(excerpt: Excerpt, simhost: Path, morvane: Path) -> str:
+    """What is wrong with an excerpt; empty when nothing is."""
+    if not (HOSTS / excerpt.host / "host.toml").exists():
+        return f"no simulated host {excerpt.host}"
+    log, output = run(simhost, morvane, excerpt.host, "nobody" in excerpt.options)
+    quoted = [line.rstrip() for line in excerpt.lines]
+    if excerpt.kind == "output":
+        actual = [line.rstrip() for line in output if line]
+        return "" if quoted == actual else f"standard output is {actual}"
+    rest = (line.rstrip() for line in log)
+    for line in quoted:
+        if not any(actual == line or "prefix" in excerpt.options and actual.startswith(line) for actual in rest):
+            return f"not in the log of {excerpt.host}, or not in this order: {line!r}"
+    return ""
+
+
+def main(simhost: str, morvane: str, *documents: str) -> int:
+    failures = 0
+    for document in map(Path, documents):
+        excerpts = list(manual_excerpts(document) if document.suffix[1:].isdigit() else markdown_excerpts(document))
+        if not excerpts:
+            print(f"{document.name}: no excerpts")
+            failures += 1
+        for excerpt in excerpts:
+            wrong = complaint(excerpt, Path(simhost), Path(morvane))
+            if wrong:
+                print(f"{excerpt.place}: {wrong}")
+                failures += 1
+        print(f"{document.name}: {len(excerpts)} excerpts checked")
+    return 1 if failures else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main(*sys.argv[1:]))
