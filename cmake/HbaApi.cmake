@@ -5,7 +5,7 @@
 find_path(HBAAPI_INCLUDE_DIR hbaapi.h REQUIRED)
 if(CMAKE_SIZEOF_VOID_P EQUAL 4)
   set(HBAAPI_LIBRARY ${CMAKE_BINARY_DIR}/packages/libhbaapi2/usr/lib/libHBAAPI.so.2)
-  set(CMAKE_BUILD_RPATH "$ORIGIN/packages/libhbaapi2/usr/lib")
+  set(CMAKE_BUILD_RPATH_USE_ORIGIN ON)
   if(NOT EXISTS ${HBAAPI_LIBRARY})
     message(FATAL_ERROR "No 32-bit libHBAAPI in ${CMAKE_BINARY_DIR}/packages/libhbaapi2: build with ./dev build i386")
   endif()
