@@ -1,0 +1,63 @@
+# Runs Morvane, and collects the answers of the tools that it is compared with; read by the other scripts of the guest.
+# shellcheck shell=bash
+
+# now: seconds since boot, with hundredths.
+now() {
+    cut -d' ' -f1 /proc/uptime
+}
+
+# run_morvane STAGE: leaves log, output, status and the times of start and end in /out/STAGE.
+run_morvane() {
+    local place=/tmp/run/$1 out=/out/$1
+    mkdir -p "$place" "$out"
+    (
+        cd "$place" || exit
+        now >started
+        /lab/morvane >stdout 2>stderr &
+        echo $! >pid
+        wait $!
+        echo $? >status
+        now >ended
+    )
+    cp "$place"/{stdout,stderr,status,started,ended} "$place/MorvaneLogs/Morvane.log" "$out/"
+}
+
+# directory_values DIRECTORY...: every readable file of the directories, as PATH:VALUE.
+directory_values() {
+    grep -s . $(find "$@" -maxdepth 1 -type f -perm -400 2>/dev/null)
+}
+
+# disk_reference DEVICE DIRECTORY: what sg3-utils reads from one disk.
+disk_reference() {
+    mkdir -p "$2"
+    sg_inq --raw --len=36 "/dev/$1" >"$2/inquiry36" 2>/dev/null
+    sg_inq --raw "/dev/$1" >"$2/inquiry" 2>/dev/null
+    sg_vpd --page=di --raw "/dev/$1" >"$2/vpd83" 2>/dev/null
+    sg_vpd --page=di "/dev/$1" >"$2/vpd83.txt" 2>&1
+    echo $? >"$2/vpd83.status"
+    sg_vpd --page=sn --raw "/dev/$1" >"$2/vpd80" 2>/dev/null
+}
+
+# reference STAGE: leaves everything Morvane's report is judged by in /out/STAGE/reference.
+reference() {
+    local out=/tmp/reference entry name
+    rm -rf $out
+    mkdir -p $out/disks
+    hostname >$out/hostname
+    for entry in /sys/block/*; do
+        name=$(basename "$entry")
+        echo "$name $(readlink "$entry")" >>$out/sys-block
+        case $name in sd*|sr*) disk_reference "$name" "$out/disks/$name" ;; esac
+    done
+    cp /proc/partitions $out/proc-partitions
+    directory_values /sys/class/fc_host/*/ >$out/fc-hosts
+    directory_values /sys/class/fc_remote_ports/*/ >$out/fc-remote-ports
+    directory_values /sys/class/fc_transport/*/ >$out/fc-targets
+    cp /etc/iscsi/initiatorname.iscsi $out/
+    iscsiadm -m session --print=3 >$out/iscsiadm-3 2>/dev/null
+    iscsiadm -m session --print=1 >$out/iscsiadm-1 2>/dev/null
+    lsscsi --transport >$out/lsscsi
+    mkdir -p "/out/$1"
+    rm -rf "/out/$1/reference"
+    cp -r $out "/out/$1/reference"
+}
