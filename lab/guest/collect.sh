@@ -27,28 +27,25 @@ directory_values() {
     grep -s . $(find "$@" -maxdepth 1 -type f -perm -400 2>/dev/null)
 }
 
-# disk_reference DEVICE DIRECTORY: what sg3-utils reads from one disk.
+# disk_reference DEVICE DIRECTORY: what sg3-utils reads from one disk. The standard INQUIRY data is asked for as Morvane
+# asks for it, 36 bytes into a buffer of 256: some adapters report such a short transfer as an error.
 disk_reference() {
     mkdir -p "$2"
-    sg_inq --raw --len=36 "/dev/$1" >"$2/inquiry36" 2>/dev/null
+    sg_raw --readonly --binary --request=256 --outfile="$2/inquiry36" "/dev/$1" 12 00 00 00 24 00 >"$2/inquiry36.txt" 2>&1
+    echo $? >"$2/inquiry36.status"
     sg_inq --raw "/dev/$1" >"$2/inquiry" 2>/dev/null
     sg_vpd --page=di --raw "/dev/$1" >"$2/vpd83" 2>/dev/null
     sg_vpd --page=di "/dev/$1" >"$2/vpd83.txt" 2>&1
-    echo $? >"$2/vpd83.status"
     sg_vpd --page=sn --raw "/dev/$1" >"$2/vpd80" 2>/dev/null
 }
 
-# reference STAGE: leaves everything Morvane's report is judged by in /out/STAGE/reference.
-reference() {
-    local out=/tmp/reference entry name
+# inventory STAGE: leaves what the kernel and iscsiadm list, without a command to any disk, in /out/STAGE/reference.
+inventory() {
+    local out=/tmp/reference entry
     rm -rf $out
-    mkdir -p $out/disks
+    mkdir -p $out "/out/$1"
     hostname >$out/hostname
-    for entry in /sys/block/*; do
-        name=$(basename "$entry")
-        echo "$name $(readlink "$entry")" >>$out/sys-block
-        case $name in sd*|sr*) disk_reference "$name" "$out/disks/$name" ;; esac
-    done
+    for entry in /sys/block/*; do echo "$(basename "$entry") $(readlink "$entry")"; done >$out/sys-block
     cp /proc/partitions $out/proc-partitions
     directory_values /sys/class/fc_host/*/ >$out/fc-hosts
     directory_values /sys/class/fc_remote_ports/*/ >$out/fc-remote-ports
@@ -57,7 +54,17 @@ reference() {
     iscsiadm -m session --print=3 >$out/iscsiadm-3 2>/dev/null
     iscsiadm -m session --print=1 >$out/iscsiadm-1 2>/dev/null
     lsscsi --transport >$out/lsscsi
-    mkdir -p "/out/$1"
     rm -rf "/out/$1/reference"
     cp -r $out "/out/$1/reference"
+}
+
+# reference STAGE: the inventory, and what sg3-utils reads from every SCSI disk.
+reference() {
+    local disks=/tmp/disks entry
+    inventory "$1"
+    rm -rf $disks
+    for entry in /sys/block/sd* /sys/block/sr*; do
+        disk_reference "$(basename "$entry")" "$disks/$(basename "$entry")"
+    done
+    cp -r $disks "/out/$1/reference/disks"
 }

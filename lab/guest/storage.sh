@@ -19,7 +19,7 @@ parameter() {
     sed -n "s/.*\blab\.$1=\([^ ]*\).*/\1/p" /proc/cmdline
 }
 
-# ---- direct disks: everything QEMU attaches (lab/devices.py), and two disks of scsi_debug
+# ---- direct disks: everything QEMU attaches (lab/devices.py), and a disk of scsi_debug
 
 direct_disks() {
     local entry count=0
@@ -36,6 +36,7 @@ direct_disks_up() {
     wait_for 60 "the direct disks" direct_disks
     # Identifiers that do not depend on the number the host got; a UUID designator instead of an NAA one.
     modprobe scsi_debug add_host=1 num_tgts=1 max_luns=1 dev_size_mb=8 delay=0 vpd_use_hostno=0 uuid_ctl=2
+    wait_for 20 "the disk of scsi_debug" test -e "/dev/$(scsi_debug_disk)"
 }
 
 # disk_by_serial SERIAL: the sdX whose unit serial number page holds the serial.
@@ -46,6 +47,11 @@ disk_by_serial() {
     done
     echo "lab: no disk has the serial number $1" >&2
     return 1
+}
+
+# scsi_debug_disk: the sdX of the scsi_debug disk that is there from the start.
+scsi_debug_disk() {
+    basename /sys/bus/pseudo/drivers/scsi_debug/adapter0/host*/target*/*/block/*
 }
 
 # ---- targets: back stores of LIO, exported over FC and iSCSI
@@ -64,14 +70,13 @@ ramdisk() {
     echo 1 >"$store/enable"
 }
 
-# passthrough NAME SERIAL: a back store that hands every command to the direct disk with that serial.
+# passthrough NAME sdX: a back store that hands every command to that disk of the guest.
 passthrough() {
-    local store=$target/core/pscsi_0/$1 disk host channel id lun
-    disk=$(disk_by_serial "$2") || return
-    IFS=: read -r host channel id lun <<<"$(basename "$(readlink "/sys/block/$disk/device")")"
+    local store=$target/core/pscsi_0/$1 host channel id lun
+    IFS=: read -r host channel id lun <<<"$(basename "$(readlink "/sys/block/$2/device")")"
     mkdir -p "$store"
     echo "scsi_host_id=$host,scsi_channel_id=$channel,scsi_target_id=$id,scsi_lun_id=$lun" >"$store/control"
-    echo "/dev/$disk" >"$store/udev_path"
+    echo "/dev/$2" >"$store/udev_path"
     echo 1 >"$store/enable"
 }
 
@@ -188,16 +193,24 @@ CONF
     wait_for 30 "9 iSCSI paths" iscsi_paths 9
 }
 
+# A virtual disk, which only /proc/partitions leads to.
+loop_up() {
+    modprobe loop
+    truncate -s 4M /tmp/loop.img
+    losetup /dev/loop0 /tmp/loop.img
+}
+
 storage_up() {
+    loop_up
     direct_disks_up
     targets_up
     ramdisk fc0 lab-fc-0; ramdisk fc1 lab-fc-1; ramdisk fc2 lab-fc-2; ramdisk fc3 lab-fc-3
     ramdisk is0 lab-iscsi-0; ramdisk is1 lab-iscsi-1; ramdisk is2 lab-iscsi-2; ramdisk is3 lab-iscsi-3
-    passthrough naa VIRTIO-0
-    passthrough plain VIRTIO-1
-    passthrough emc 000190100123
-    passthrough ata PIIX-0
-    passthrough debug "$(tail -c +5 /sys/bus/pseudo/drivers/scsi_debug/adapter0/host*/target*/*/vpd_pg80)"
+    passthrough naa "$(disk_by_serial VIRTIO-0)"
+    passthrough plain "$(disk_by_serial VIRTIO-1)"
+    passthrough emc "$(disk_by_serial 000190100123)"
+    passthrough ata "$(disk_by_serial PIIX-0)"
+    passthrough debug "$(scsi_debug_disk)"
     fc_up
     iscsi_up
 }

@@ -1,0 +1,360 @@
+#!/usr/bin/env python3
+"""Compares what Morvane reported in the laboratory with what the trusted tools said there.
+
+usage: lab/judge.py build/lab/ARCH/out
+
+Device names change from boot to boot, but within one stage of one boot a name means the same disk to Morvane and to the
+tools; that is the only place where names are compared. Exit status 1 if anything differs.
+"""
+
+import re
+import sys
+from collections import Counter
+from pathlib import Path
+
+import morvane_log
+from morvane_log import Report
+from reference import PREFERENCE, Reference, expected_identifier, wwn
+
+TREE_FC, TREE_DAS, TREE_ISCSI = 1, 2, 4
+OTHER = {"amd64": "i386", "i386": "amd64"}
+ACCEPTED_SCALE_RATIO = 5.0
+
+
+class Sheet:
+    """The judge's tables: a row for each thing compared."""
+
+    def __init__(self) -> None:
+        self.mismatches = 0
+        self.rows = 0
+
+    def title(self, text: str) -> None:
+        print(f"\n{text}\n{'-' * len(text)}")
+
+    def row(self, what: str, holds: bool, detail: str = "") -> None:
+        self.rows += 1
+        self.mismatches += not holds
+        print(f"  {'ok      ' if holds else 'MISMATCH'}  {what:<58}  {detail}".rstrip())
+
+    def same(self, what: str, expected: set, found: set, detail: str = "") -> None:
+        """A row for two sets, followed by what only one of them has."""
+        self.row(what, expected == found, detail or f"{len(found)}")
+        for side, items in (("only the tools", expected - found), ("only Morvane", found - expected)):
+            for item in sorted(items, key=str):
+                print(f"            {side}: {item}")
+
+
+class Stage:
+    """One run of Morvane: its report, the tools' answers, the facts of the fault."""
+
+    def __init__(self, place: Path) -> None:
+        self.name = place.name
+        self.log = (place / "Morvane.log").read_bytes().decode("latin-1")
+        self.report: Report = morvane_log.read(place / "Morvane.log")
+        self.reference = Reference(place / "reference")
+        self.stdout = (place / "stdout").read_text(errors="replace")
+        self.status = int((place / "status").read_text())
+        self.seconds = float((place / "ended").read_text()) - float((place / "started").read_text())
+        facts = place / "facts"
+        lines = facts.read_text().splitlines() if facts.exists() else []
+        self.facts = dict(line.split("=", 1) for line in lines)
+
+
+def ran_to_its_end(stage: Stage) -> bool:
+    # The HBA library may print lines of its own on standard output before Morvane's.
+    return (
+        stage.status == 0
+        and stage.stdout.endswith("Test completed.\n")
+        and list(stage.report.sections) == list(morvane_log.BANNERS)
+        and stage.report.sections["END"] == ""
+    )
+
+
+def judge_accounting(sheet: Sheet, stage: Stage) -> None:
+    """Every real block device and every partition is accounted for exactly once."""
+    report, reference = stage.report, stage.reference
+    earlier = set(report.claimed_by(TREE_FC)) | set(report.claimed_by(TREE_ISCSI))
+    mentioned = Counter([device for device, _ in report.das] + report.not_supported)
+    sheet.same(
+        "real devices that no earlier tree claimed: DAS has each",
+        set(reference.real_devices()) - earlier,
+        set(mentioned),
+    )
+    sheet.row("DAS has none twice", all(count == 1 for count in mentioned.values()))
+    claimed = earlier | {device for device, _ in report.das}
+    logical = Counter(device for device, _ in report.logical)
+    sheet.same(
+        "/proc/partitions less what was claimed: LOGICAL has each",
+        set(reference.partitions()) - claimed,
+        set(logical),
+        f"{len(reference.partitions())} lines, {len(logical)} logical",
+    )
+    sheet.row("LOGICAL has none twice", all(count == 1 for count in logical.values()))
+    host = reference.hostname()
+    sheet.row(
+        "logical identifiers: host name and device",
+        all(identifier == f"{host} :: {device}" for device, identifier in report.logical),
+    )
+
+
+def judge_fc(sheet: Sheet, stage: Stage) -> None:
+    report, reference = stage.report, stage.reference
+    hosts = {(wwn(host["node_name"]), wwn(host["port_name"])) for host in reference.fc_hosts().values()}
+    sheet.title("Fibre Channel")
+    sheet.same("adapters and ports: WWNN and WWPN as in sysfs", hosts, set(report.fc_ports))
+    sheet.row("at least 4 ports", len(report.fc_ports) >= 4, f"{len(report.fc_ports)}")
+    fabrics = {(path.initiator_wwpn, path.target_wwpn) for path in report.fc_paths}
+    sheet.row("two fabrics", len(fabrics) == 2, ", ".join(" > ".join(fabric) for fabric in sorted(fabrics)))
+    sheet.row("at least 16 LUN paths", len(report.fc_paths) >= 16, f"{len(report.fc_paths)}")
+    sheet.same(
+        "paths: ports, bus, target, device, LUN, FCID as in sysfs",
+        reference.fc_paths(),
+        {
+            (
+                path.adapter_wwnn, path.initiator_wwpn, path.target_wwnn, path.target_wwpn,
+                path.bus, path.target, path.device, path.lun, path.fcid,
+            )
+            for path in report.fc_paths
+        },
+    )
+    sheet.row("FCP LUN is the LUN", all(path.fcplun == path.lun for path in report.fc_paths))
+    sheet.same(
+        "claimed for the FC tree: the devices of these paths",
+        {path[6] for path in reference.fc_paths()},
+        set(report.claimed_by(TREE_FC)),
+    )
+    for path in sorted(report.fc_paths, key=lambda path: (path.initiator_wwpn, path.lun)):
+        expected = expected_identifier(reference, path.device)
+        sheet.row(
+            f"{path.initiator_wwpn} LUN {path.lun}: {expected.reason}",
+            path.identifier == expected.identifier,
+            path.identifier if path.identifier == expected.identifier else f"{path.identifier} not {expected.identifier}",
+        )
+    by_lun: dict[int, set[str]] = {}
+    for path in report.fc_paths:
+        by_lun.setdefault(path.lun, set()).add(path.identifier)
+    sheet.row(
+        "one LUN has one identifier on both fabrics, and no other's",
+        all(len(identifiers) == 1 for identifiers in by_lun.values())
+        and len(set.union(*by_lun.values())) == len(by_lun),
+        f"{len(by_lun)} LUNs",
+    )
+
+
+def judge_iscsi(sheet: Sheet, stage: Stage) -> None:
+    report, reference = stage.report, stage.reference
+    sheet.title("iSCSI")
+    expected = reference.iscsi_paths()
+    sessions = {path[2:4] for path in expected}
+    sheet.row("sessions: two over IPv4, one over IPv6", sorted("." in portal for _, portal in sessions) == [False, True, True])
+    sheet.same(
+        "paths: initiator, target, addresses, device, LUN",
+        expected,
+        {
+            (path.initiator, path.target, path.initiator_port, path.target_port, path.device, path.lun)
+            for path in report.iscsi_paths
+        },
+    )
+    sheet.row("no path twice", len(report.iscsi_paths) == len(set(report.iscsi_paths)))
+    sheet.same("claimed for the iSCSI tree", {path[4] for path in expected}, set(report.claimed_by(TREE_ISCSI)))
+    for path in sorted(report.iscsi_paths, key=lambda path: (path.target, path.target_port, path.lun)):
+        outcome = expected_identifier(reference, path.device)
+        identifier = outcome.identifier or ":-( SCSI_Inquiry_Failed"
+        sheet.row(
+            f"{path.target} {path.target_port} LUN {path.lun}: {outcome.reason}",
+            path.identifier == identifier,
+            path.identifier if path.identifier == identifier else f"{path.identifier} not {identifier}",
+        )
+
+
+def judge_direct(sheet: Sheet, stage: Stage) -> None:
+    report, reference = stage.report, stage.reference
+    sheet.title("Direct disks and logical devices")
+    judge_accounting(sheet, stage)
+    host = reference.hostname()
+    for device, identifier in sorted(report.das):
+        outcome = expected_identifier(reference, device)
+        # A direct disk without a designator of these kinds is named after the host, not after its INQUIRY data.
+        expected = outcome.identifier if outcome.reason in PREFERENCE else f"{host}::{device}"
+        sheet.row(
+            f"{describe(reference, device)}: {outcome.reason}",
+            outcome.supported and identifier == expected,
+            identifier if identifier == expected else f"{identifier} not {expected}",
+        )
+    for device in sorted(report.not_supported):
+        outcome = expected_identifier(reference, device)
+        sheet.row(f"{describe(reference, device)}: {outcome.reason}", not outcome.supported, "not supported")
+
+
+def describe(reference: Reference, device: str) -> str:
+    inquiry = reference.raw(device, "inquiry")
+    name = inquiry[8:32].decode("latin-1").split() if len(inquiry) >= 32 else []
+    return " ".join([device, *name])
+
+
+# ---- faults
+
+
+def faults_lun_offline(stage: Stage) -> list[tuple[str, bool]]:
+    fc, direct = stage.facts["fc"], stage.facts["direct"]
+    healthy = {path[6] for path in stage.reference.fc_paths()} - {fc}
+    named = {path.device for path in stage.report.fc_paths}
+    return [
+        ("FC: both documented lines for the LUN", all(
+            line in stage.log
+            for line in (
+                f"Cannot do Scsi Inquiry on {fc} - No such device or address\n",
+                f"Failed in getting the uniqueLunId for device {fc} ignoring\n",
+            )
+        ) and re.search(rf"Failed in getting the VendorId for device {fc} Lun \d+ Under Target [0-9a-f:]+ ignoring\n", stage.log) is not None),
+        # A skipped LUN leaves a hole in the adapter's table; the printer stops that many entries early.
+        ("FC: not reported; at most one other path missing", fc not in named and len(healthy - named) <= 1),
+        ("DAS: direct disk not supported", direct in stage.report.not_supported),
+    ]
+
+
+def faults_lun_without_identifier(stage: Stage) -> list[tuple[str, bool]]:
+    fc = stage.facts["fc"]
+    lost = {path[1] for path in stage.reference.fc_paths() if path[6] == fc}
+    seen = {path.initiator_wwpn for path in stage.report.fc_paths}
+    return [
+        ("FC: documented lines", "No bytes for undocumented ID\n" in stage.log
+         and "Unexpected Malformed Std Inquiry Data\n" in stage.log
+         and stage.log.count("Exception occured while opening adapter: ") == 1),
+        ("FC: this adapter's tree is given up, the other's is whole",
+         not lost & seen and len(stage.report.fc_paths) == 8),
+    ]
+
+
+def faults_command_lost(stage: Stage) -> list[tuple[str, bool]]:
+    direct, host = stage.facts["direct"], stage.reference.hostname()
+    # Over FC the initiator's own recovery may answer for the target before Morvane's 10 s are over.
+    given_up = re.findall(r"(?:SCSI Error for|Time-out in Getting) Std Inquiry Data\n", stage.log)
+    return [
+        (f"FC: adapters given up: {', '.join(sorted({line.strip() for line in given_up}))}",
+         len(given_up) >= 2 and stage.log.count("Exception occured while opening adapter: ") == 2
+         and not stage.report.fc_paths),
+        ("DAS: time-outs, host name as identifier",
+         "Time-out in Reading VPD 0x83 Page\n" in stage.log and (direct, f"{host}::{direct}") in stage.report.das),
+    ]
+
+
+def faults_link_down(stage: Stage) -> list[tuple[str, bool]]:
+    adapter = stage.facts["adapter"]
+    return [
+        ("FC: the adapter's tree is given up", f"Exception occured while opening adapter: {adapter}\n" in stage.log
+         and stage.log.count("Exception occured while opening adapter: ") == 1),
+        ("FC: the other adapter's tree is whole", len(stage.report.fc_paths) == 8),
+    ]
+
+
+def faults_iscsi_target_gone(stage: Stage) -> list[tuple[str, bool]]:
+    target = stage.facts["target"]
+    gone = [path for path in stage.report.iscsi_paths if path.target == target]
+    other = [path for path in stage.report.iscsi_paths if path.target != target]
+    return [
+        ("iSCSI: its disks are listed without identifier",
+         len(gone) == 6 and all(path.identifier == ":-( SCSI_Inquiry_Failed" for path in gone)),
+        ("iSCSI: the other target's disks are whole", len(other) == 3
+         and sum(path.identifier == ":-( SCSI_Inquiry_Failed" for path in other) == 1),
+    ]
+
+
+# Stage, seconds that the run may take, what must be seen. The seconds are those of the time-outs that the fault meets
+# (10 s a command, 5 s for an iSCSI session, 2 s for an FC port), and as much again for a loaded machine.
+FAULTS = {
+    "lun-offline": (20, faults_lun_offline),
+    "lun-without-identifier": (20, faults_lun_without_identifier),
+    "command-lost": (90, faults_command_lost),
+    "link-down": (60, faults_link_down),
+    "iscsi-target-gone": (60, faults_iscsi_target_gone),
+}
+
+
+def judge_fault(sheet: Sheet, stage: Stage) -> None:
+    limit, outcomes = FAULTS[stage.name]
+    sheet.title(f"Fault: {stage.name}")
+    sheet.row("the run ends, within the limit", ran_to_its_end(stage) and stage.seconds <= limit,
+              f"{stage.seconds:.1f} s of {limit} s")
+    for what, holds in outcomes(stage):
+        sheet.row(what, holds)
+    sheet.row("no tree is cut short", "Caught exception while building" not in stage.log)
+    judge_accounting(sheet, stage)
+
+
+# ---- scale and word sizes
+
+
+def judge_scale(sheet: Sheet, place: Path) -> None:
+    sheet.title("Scale")
+    stage = Stage(place)
+    times = {
+        name: float(end) - float(start)
+        for name, start, end in (line.split() for line in (place / "times").read_text().splitlines())
+    }
+    # What the loop has to do with: two commands on each disk.
+    designators = int((place / "sg3-designators").read_text())
+    disks = [identifier for _, identifier in stage.report.das if identifier.startswith("Linux   scsi_debug")]
+    sheet.row("the run ends", ran_to_its_end(stage), f"{times['morvane']:.1f} s")
+    sheet.row("1,000 disks of scsi_debug beside the others, no two alike",
+              len(disks) == 1001 and len(set(disks)) == 1001, f"{len(set(disks))} of {len(stage.report.das)} direct disks")
+    judge_accounting(sheet, stage)
+    ratio = times["sg3-loop"] / times["morvane"]
+    sheet.row(
+        f"shell loop of sg_inq and sg_vpd: at least {ACCEPTED_SCALE_RATIO:.0f} times Morvane's time",
+        ratio >= ACCEPTED_SCALE_RATIO and designators > 0,
+        f"{times['sg3-loop']:.1f} s, {ratio:.1f} times",
+    )
+    print(f"            for comparison: lsscsi -i, which sends no command, {times['lsscsi']:.1f} s, "
+          f"{times['lsscsi'] / times['morvane']:.2f} times")
+
+
+def comparable(stage: Stage) -> set[tuple]:
+    """The report without what changes from boot to boot: device names, host numbers and their order."""
+    report = stage.report
+
+    def without_device(identifier: str) -> str:
+        return re.sub(r"/dev/\S+", "DEVICE", identifier)
+
+    return (
+        {("FC port", *port) for port in report.fc_ports}
+        | {("FC", path.initiator_wwpn, path.target_wwpn, path.lun, path.fcid, path.identifier) for path in report.fc_paths}
+        | {("iSCSI", path.initiator_port, path.target_port, path.target, path.lun, path.identifier) for path in report.iscsi_paths}
+        | {("DAS", identifier) for _, identifier in report.das if "::" not in identifier}
+        | {("counts", "DAS named after the host", sum("::" in identifier for _, identifier in report.das))}
+        | {("counts", "not supported", len(report.not_supported)), ("counts", "logical", len(report.logical))}
+    )
+
+
+def judge_word_sizes(sheet: Sheet, arch: str, healthy: Stage, other_place: Path) -> None:
+    sheet.title("Word sizes")
+    if not (other_place / "done").exists():
+        print(f"  not compared: there is no run of {OTHER[arch]}; './dev lab {OTHER[arch]}' makes one")
+        return
+    other = Stage(other_place / "healthy")
+    sheet.same(f"{arch} and {OTHER[arch]} report the same", comparable(other), comparable(healthy))
+
+
+def main() -> int:
+    place = Path(sys.argv[1]).resolve()
+    arch = place.parent.name
+    sheet = Sheet()
+    healthy = Stage(place / "healthy")
+    sheet.title("Healthy storage")
+    sheet.row("the run ends", ran_to_its_end(healthy), f"{healthy.seconds:.1f} s")
+    sheet.row("no tree is cut short", "Caught exception while building" not in healthy.log)
+    judge_fc(sheet, healthy)
+    judge_iscsi(sheet, healthy)
+    judge_direct(sheet, healthy)
+    for name in FAULTS:
+        if (place / name).exists():
+            judge_fault(sheet, Stage(place / name))
+    if (place / "scale").exists():
+        judge_scale(sheet, place / "scale")
+    judge_word_sizes(sheet, arch, healthy, place.parent.parent / OTHER[arch] / "out")
+    print(f"\nlab {arch}: {sheet.rows} compared, {sheet.mismatches} mismatches")
+    return 1 if sheet.mismatches else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())
