@@ -240,11 +240,15 @@ def faults_command_lost(stage: Stage) -> list[tuple[str, bool]]:
 
 
 def faults_link_down(stage: Stage) -> list[tuple[str, bool]]:
-    adapter = stage.facts["adapter"]
+    adapter, port = stage.facts["adapter"], stage.facts["port"]
+    left = [path for path in stage.report.fc_paths if path.initiator_wwpn == port]
+    # The command that meets the fault decides: standard INQUIRY gives the adapter up, page 0x83 only the LUN.
+    given_up = f"Exception occured while opening adapter: {adapter}\n" in stage.log
+    ignored = len(re.findall(r"Failed in getting the uniqueLunId for device \S+ ignoring\n", stage.log))
+    outcome = f"tree given up after {ignored} LUNs" if given_up else f"{ignored} LUNs ignored"
     return [
-        ("FC: the adapter's tree is given up", f"Exception occured while opening adapter: {adapter}\n" in stage.log
-         and stage.log.count("Exception occured while opening adapter: ") == 1),
-        ("FC: the other adapter's tree is whole", len(stage.report.fc_paths) == 8),
+        (f"FC: the adapter without link: {outcome}", given_up and not left or ignored > 0 and len(left) <= 8 - ignored),
+        ("FC: the other adapter's tree is whole", len(stage.report.fc_paths) == len(left) + 8),
     ]
 
 

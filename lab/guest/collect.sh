@@ -24,7 +24,7 @@ run_morvane() {
 
 # directory_values DIRECTORY...: every readable file of the directories, as PATH:VALUE.
 directory_values() {
-    grep -s . $(find "$@" -maxdepth 1 -type f -perm -400 2>/dev/null)
+    find "$@" -maxdepth 1 -type f -perm -400 -exec grep -Hs . {} +
 }
 
 # disk_reference DEVICE DIRECTORY: what sg3-utils reads from one disk. The standard INQUIRY data is asked for as Morvane

@@ -1,6 +1,6 @@
 # The faults, one function each; read by the other scripts of the guest. To add one, write a function stage_NAME that
 # breaks something, calls faulty_run, and mends it; add NAME to STAGES in lab/run; and say in lab/judge.py what must be seen.
-# shellcheck shell=bash
+# shellcheck shell=bash disable=SC2154 # names of storage.sh
 
 # fact STAGE NAME VALUE: a fact that the judge needs to know about the fault.
 fact() {
@@ -62,6 +62,7 @@ stage_link_down() {
     fact link-down adapter "$adapter"
     card=${adapter#fcoe:}
     card=${card%-*}
+    fact link-down port "20:00:$(cat "/sys/class/net/$card/address")"
     ip link set "$card" down
     kill -CONT "$(cat $place/pid)"
     wait %%
