@@ -45,7 +45,10 @@ inventory() {
     rm -rf $out
     mkdir -p $out "/out/$1"
     hostname >$out/hostname
-    for entry in /sys/block/*; do echo "$(basename "$entry") $(readlink "$entry")"; done >$out/sys-block
+    # In the order of the directory.
+    find /sys/block -mindepth 1 | while read -r entry; do
+        echo "$(basename "$entry") $(readlink "$entry")"
+    done >$out/sys-block
     cp /proc/partitions $out/proc-partitions
     directory_values /sys/class/fc_host/*/ >$out/fc-hosts
     directory_values /sys/class/fc_remote_ports/*/ >$out/fc-remote-ports
