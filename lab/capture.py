@@ -16,8 +16,9 @@ import morvane_log
 from reference import Reference
 
 ORIGIN = """\
-# Captured in the laboratory (docs/lab.md): Debian 12's kernel {kernel}, {tools},
-# storage under QEMU. Written by lab/capture.py; do not edit.
+# Captured in the laboratory (docs/lab.md) with Debian 12's kernel {kernel}:
+# {tools}.
+# Written by lab/capture.py; do not edit.
 """
 TOOLS = {
     "fc": "software FCoE ports and LIO targets seen through libhbaapi2 and libhbalinux2",

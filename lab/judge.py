@@ -275,15 +275,19 @@ FAULTS = {
 }
 
 
-def judge_fault(sheet: Sheet, stage: Stage) -> None:
-    limit, outcomes = FAULTS[stage.name]
+def judge_fault(sheet: Sheet, stage: Stage) -> list[str]:
+    """Judges one fault; gives its lines for the table of faults and outcomes."""
+    limit, outcomes_of = FAULTS[stage.name]
+    outcomes = outcomes_of(stage)
     sheet.title(f"Fault: {stage.name}")
     sheet.row("the run ends, within the limit", ran_to_its_end(stage) and stage.seconds <= limit,
               f"{stage.seconds:.1f} s of {limit} s")
-    for what, holds in outcomes(stage):
+    for what, holds in outcomes:
         sheet.row(what, holds)
     sheet.row("no tree is cut short", "Caught exception while building" not in stage.log)
     judge_accounting(sheet, stage)
+    lines = [what if holds else f"NOT {what}" for what, holds in outcomes]
+    return [f"  {stage.name:<24}{stage.seconds:6.1f} s  {lines[0]}", *(f"{'':36}{line}" for line in lines[1:])]
 
 
 # ---- scale and word sizes
@@ -330,10 +334,12 @@ def comparable(stage: Stage) -> set[tuple]:
     )
 
 
-def judge_word_sizes(sheet: Sheet, arch: str, healthy: Stage, other_place: Path) -> None:
+def judge_word_sizes(sheet: Sheet, arch: str, healthy: Stage, place: Path) -> None:
     sheet.title("Word sizes")
-    if not (other_place / "done").exists():
-        print(f"  not compared: there is no run of {OTHER[arch]}; './dev lab {OTHER[arch]}' makes one")
+    other_place = place.parent.parent / OTHER[arch] / "out"
+    setups = [(out / "setup").read_text() for out in (place, other_place) if (out / "done").exists()]
+    if len(setups) != 2 or setups[0] != setups[1]:
+        print(f"  not compared: no run of {OTHER[arch]} with this set-up; './dev lab {OTHER[arch]}' makes one")
         return
     other = Stage(other_place / "healthy")
     sheet.same(f"{arch} and {OTHER[arch]} report the same", comparable(other), comparable(healthy))
@@ -350,12 +356,13 @@ def main() -> int:
     judge_fc(sheet, healthy)
     judge_iscsi(sheet, healthy)
     judge_direct(sheet, healthy)
-    for name in FAULTS:
-        if (place / name).exists():
-            judge_fault(sheet, Stage(place / name))
+    table = [line for name in FAULTS if (place / name).exists() for line in judge_fault(sheet, Stage(place / name))]
+    if table:
+        sheet.title("Faults and outcomes")
+        print("\n".join(table))
     if (place / "scale").exists():
         judge_scale(sheet, place / "scale")
-    judge_word_sizes(sheet, arch, healthy, place.parent.parent / OTHER[arch] / "out")
+    judge_word_sizes(sheet, arch, healthy, place)
     print(f"\nlab {arch}: {sheet.rows} compared, {sheet.mismatches} mismatches")
     return 1 if sheet.mismatches else 0
 
