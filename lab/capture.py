@@ -105,8 +105,8 @@ def host(kind: str, reference: Reference, log: str, report: morvane_log.Report, 
 def main() -> None:
     place, hosts = Path(sys.argv[1]), Path(sys.argv[2])
     reference = Reference(place / "healthy" / "reference")
-    report = morvane_log.read(place / "healthy" / "Morvane.log")
     log = (place / "healthy" / "Morvane.log").read_bytes().decode("latin-1")
+    report = morvane_log.read(log)
     kernel = (place.parent / "kernel-version").read_text().strip()
     for kind in ABOUT:
         folder = hosts / f"lab-{kind}"

@@ -2,7 +2,6 @@
 
 import re
 from dataclasses import dataclass, field
-from pathlib import Path
 
 BAR = "================================================"
 BANNERS = {
@@ -89,8 +88,8 @@ def read_fc_tree(report: Report, text: str) -> None:
             )
 
 
-def read(path: Path) -> Report:
-    text = TRACE.sub("", path.read_bytes().decode("latin-1"))
+def read(log: str) -> Report:
+    text = TRACE.sub("", log)
     report = Report(split_sections(text))
     read_fc_tree(report, report.sections.get("FC", ""))
     for match in re.finditer(

@@ -77,7 +77,7 @@ class Reference:
         """Every disk of iscsiadm's listing: initiator, target, interface address and portal address, each address up to
         its first colon, device node, LUN."""
         paths = set()
-        initiator = re.search(r"^InitiatorName=(\S+)", self.text("initiatorname.iscsi"), re.M)[1]
+        initiator = self.text("initiatorname.iscsi").strip().removeprefix("InitiatorName=")
         target = portal = address = ""
         lun = -1
         for line in self.text("iscsiadm-3").splitlines():

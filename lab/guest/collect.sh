@@ -9,6 +9,7 @@ now() {
 # run_morvane STAGE: leaves log, output, status and the times of start and end in /out/STAGE.
 run_morvane() {
     local place=/tmp/run/$1 out=/out/$1
+    rm -rf "$place"
     mkdir -p "$place" "$out"
     (
         cd "$place" || exit

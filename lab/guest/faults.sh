@@ -51,20 +51,32 @@ stage_command_lost() {
     echo 0 >$debug/every_nth
 }
 
+# reaches PLACE TEXT: lets the Morvane that runs in PLACE go on until its log holds the text, and stops it there. It runs
+# in slices of a few milliseconds, so that it cannot get far past the text while the log is searched.
+reaches() {
+    local started=$SECONDS
+    until [ -s "$1/pid" ]; do [ $((SECONDS - started)) -lt 30 ] || return 1; done
+    until grep -qs "$2" "$1/MorvaneLogs/Morvane.log"; do
+        [ $((SECONDS - started)) -lt 60 ] && kill -CONT "$(<"$1/pid")" || return 1
+        read -rt 0.005 <> <(:)
+        kill -STOP "$(<"$1/pid")"
+    done
+}
+
 # The link of an initiator port goes down while Morvane reads that adapter's disks.
 stage_link_down() {
     local place=/tmp/run/link-down adapter card
     inventory link-down
+    rm -rf $place
     run_morvane link-down &
-    wait_for 30 "Morvane's first FC disk" grep -qs "Added to DevMap" $place/MorvaneLogs/Morvane.log
-    kill -STOP "$(cat $place/pid)"
+    reaches $place "Added to DevMap" || echo "lab: link-down: Morvane did not get to an FC disk"
     adapter=$(sed -n 's/^Going to open adapter, adapter name = <\(.*\)>$/\1/p' $place/MorvaneLogs/Morvane.log | tail -1)
     fact link-down adapter "$adapter"
     card=${adapter#fcoe:}
     card=${card%-*}
     fact link-down port "20:00:$(cat "/sys/class/net/$card/address")"
     ip link set "$card" down
-    kill -CONT "$(cat $place/pid)"
+    kill -CONT "$(<$place/pid)"
     wait %%
     ip link set "$card" up
     wait_for 60 "16 online FC paths" fc_online 16

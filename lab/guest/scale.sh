@@ -29,7 +29,7 @@ sg3_loop() {
 }
 
 stage_scale() {
-    local debug=/sys/bus/pseudo/drivers/scsi_debug
+    local debug=/sys/bus/pseudo/drivers/scsi_debug place=/tmp/run/scale
     mkdir -p /out/scale
     echo 10 >$debug/num_tgts
     echo 100 >$debug/max_luns
@@ -37,7 +37,10 @@ stage_scale() {
     echo 1 >$debug/add_host
     wait_for 120 "1,000 disks" thousand_disks
     inventory scale
-    timed morvane run_morvane scale
+    for _ in 1 2 3; do
+        run_morvane scale
+        echo "morvane $(<$place/started) $(<$place/ended)" >>/out/scale/times
+    done
     timed sg3-loop sg3_loop
     timed lsscsi lsscsi -i >/tmp/lsscsi
     grep -c "designator type" /tmp/sg3-loop >/out/scale/sg3-designators
