@@ -21,7 +21,7 @@ struct Mapping {
                 &std::free) {}
 
     HBA_FCPSCSIENTRYV2& add(const std::string& name, HBA_UINT32 lun, unsigned char target,
-                            const std::string& luid) {
+                            const std::string& luid) const {
         HBA_FCPSCSIENTRYV2& slot = block->entry[block->NumberOfEntries++];
         const HBA_FCPSCSIENTRY entry = fakeEntry(name, lun, target);
         slot.ScsiId = entry.ScsiId;
@@ -55,7 +55,7 @@ protected:
         HA_PrintAdapterTree(adapter.attributes, *records, *mMapping.block, stream);
         EXPECT_EQ(reportLog.text(), "Entered Function HA_PrintAdapterTree Line #\n"
                                     "Left Function HA_PrintAdapterTree Line #\n");
-        std::fclose(stream);
+        static_cast<void>(std::fclose(stream));
         std::string result(text, size);
         std::free(text);
         return result;

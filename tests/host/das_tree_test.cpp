@@ -46,7 +46,7 @@ protected:
         DevMap.clear();
         mFiles.directory("/sys/block");
     }
-    ~DasTree() override { DevMap.clear(); }
+    void TearDown() override { DevMap.clear(); }
 
     // The log of the gathering without its two traces.
     static std::string gathered() {

@@ -78,24 +78,24 @@ std::vector<std::string> HostFiles::entries(const std::string& path) const {
 
 extern "C" {
 
-std::FILE* fopen(const char* path, const char* mode) {
+std::FILE* fopen(const char* filename, const char* modes) {
     static auto* const real = reinterpret_cast<std::FILE* (*)(const char*, const char*)>(
         dlsym(RTLD_NEXT, sizeof(off_t) > sizeof(long) ? "fopen64" : "fopen"));
-    return real(resolved(path).c_str(), mode);
+    return real(resolved(filename).c_str(), modes);
 }
 
-DIR* opendir(const char* path) {
-    const int fd = open(resolved(path).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+DIR* opendir(const char* name) {
+    const int fd = open(resolved(name).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
     return fd >= 0 ? fdopendir(fd) : nullptr;
 }
 
-ssize_t readlink(const char* path, char* target, size_t size) noexcept {
-    return readlinkat(AT_FDCWD, resolved(path).c_str(), target, size);
+ssize_t readlink(const char* path, char* buf, size_t len) noexcept {
+    return readlinkat(AT_FDCWD, resolved(path).c_str(), buf, len);
 }
 
-int readdir_r(DIR* directory, dirent* entry, dirent** result) {
+int readdir_r(DIR* dirp, dirent* entry, dirent** result) {
     errno = 0;
-    const dirent* const next = readdir(directory);
+    const dirent* const next = readdir(dirp);
     *result = nullptr;
     if (next == nullptr) {
         return errno;

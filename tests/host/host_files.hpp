@@ -23,7 +23,7 @@ public:
 
     // From now on the file system does not tell the type of this directory entry.
     void hideType(const std::string& entryName) { mUntyped.insert(entryName); }
-    bool isTypeHidden(const std::string& entryName) const { return mUntyped.count(entryName) != 0; }
+    bool isTypeHidden(const std::string& entryName) const { return mUntyped.contains(entryName); }
 
     // The names in a directory, in the order in which it is read.
     std::vector<std::string> entries(const std::string& path) const;

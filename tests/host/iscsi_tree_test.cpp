@@ -75,7 +75,7 @@ protected:
         std::string("hostA").copy(mHostName, sizeof mHostName - 1);
     }
 
-    ~IscsiTree() override {
+    void TearDown() override {
         gIscsiPortList.clear();
         gIscsiPortMap.clear();
         DevMap.clear();
@@ -473,7 +473,7 @@ protected:
         readInitiatorIQN();
         gHostName = mHostName;
     }
-    ~IscsiTreeWithoutInitiator() override { gHostName = nullptr; }
+    void TearDown() override { gHostName = nullptr; }
 
     char mNoName[kHostNameSize] = "";
     char mHostName[kHostNameSize] = "hostA";

@@ -34,7 +34,7 @@ protected:
         DevMap.clear();
         gHostName = mHostName;
     }
-    ~LogicalTree() override {
+    void TearDown() override {
         DevMap.clear();
         gHostName = nullptr;
     }

@@ -39,7 +39,7 @@ TEST(EmulexHash, TakesTheTailByByteAndUnsigned) {
 class DeviceRegister : public testing::Test {
 protected:
     DeviceRegister() { DevMap.clear(); }
-    ~DeviceRegister() override { DevMap.clear(); }
+    void TearDown() override { DevMap.clear(); }
 };
 
 TEST_F(DeviceRegister, LogsWhatItRegisters) {

@@ -53,7 +53,7 @@ protected:
         gDirectAttachedFlag = false;
         gHostName = mHostName;
     }
-    ~DeviceReport() override {
+    void TearDown() override {
         DevMap.clear();
         gIscsiPortList.clear();
         gDirectAttachedFlag = false;

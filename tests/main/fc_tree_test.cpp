@@ -24,7 +24,7 @@ const std::string kLeft = "Left Function BuildFcTree Line #\n";
 
 class FcTree : public testing::Test {
 protected:
-    ~FcTree() override {
+    void TearDown() override {
         const LogCapture log;
         cleanUpFcTree();
     }

@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
-#include <cstring>
 #include <string>
 #include <vector>
 
@@ -69,7 +68,8 @@ std::string parseLog(const std::vector<std::pair<std::string, std::string>>& pai
         "Entered Function sParseOutputLine Line #\nLeft Function sParseOutputLine Line #\n";
     std::string log = "Entered Function __parse Line #\n";
     for (const auto& [pseudoDevice, ulid] : pairs) {
-        log += trace + "pseudo device - " + pseudoDevice + "\n" + trace + "ulid - " + ulid + "\n";
+        log.append(trace).append("pseudo device - ").append(pseudoDevice).append("\n");
+        log.append(trace).append("ulid - ").append(ulid).append("\n");
     }
     return log + "Left Function __parse Line #\n";
 }
@@ -537,7 +537,7 @@ TEST(PowerPathCommand, KeepsTheNamesAndIdentifiersOfTheListing) {
 
 // A buffer as sExecuteCommand has it.
 struct OutputBuffer {
-    explicit OutputBuffer(const char* content) { std::strcpy(text, content); }
+    explicit OutputBuffer(const std::string& content) { content.copy(text, sizeof text - 1); }
     char text[Handler::kOutputSize] = {};
 };
 
@@ -640,7 +640,7 @@ TEST(PowerPathParseLine, EndsTheProcessWithoutLines) {
 } // namespace
 
 // Pauses are counted, not taken.
-extern "C" int usleep(useconds_t microseconds) {
-    gPauses.push_back(microseconds);
+extern "C" int usleep(useconds_t useconds) {
+    gPauses.push_back(useconds);
     return 0;
 }

@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
-#include <cstring>
 #include <memory>
 #include <set>
 
@@ -26,7 +25,7 @@ ssize_t readOutput(void* cookie, char* buffer, std::size_t size) {
         errno = EIO;
         return -1;
     }
-    std::memcpy(buffer, output.run.output.data() + output.position, count);
+    output.run.output.copy(buffer, count, output.position);
     output.position += count;
     return static_cast<ssize_t>(count);
 }
@@ -67,11 +66,11 @@ std::size_t FakeCommands::openStreams() {
 
 extern "C" {
 
-std::FILE* popen(const char* command, const char* mode) {
+std::FILE* popen(const char* command, const char* modes) {
     if (gCommands == nullptr) {
         static auto* const real =
             reinterpret_cast<std::FILE* (*)(const char*, const char*)>(dlsym(RTLD_NEXT, "popen"));
-        return real(command, mode);
+        return real(command, modes);
     }
     FakeRun run = gCommands->take(command);
     if (!run.canStart) {
@@ -81,7 +80,7 @@ std::FILE* popen(const char* command, const char* mode) {
     auto output = std::make_unique<Output>();
     output->run = std::move(run);
     std::FILE* const stream =
-        fopencookie(output.release(), mode,
+        fopencookie(output.release(), modes,
                     {.read = readOutput, .write = nullptr, .seek = nullptr, .close = closeOutput});
     gOpenStreams.insert(stream);
     return stream;

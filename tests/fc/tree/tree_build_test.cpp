@@ -126,7 +126,7 @@ protected:
         DevMap.clear();
     }
 
-    ~FcTreeBuild() override {
+    void TearDown() override {
         const LogCapture log;
         cleanUpFcTree();
         FakeCommands noCommands;
@@ -657,10 +657,10 @@ TEST_F(FcTreeBuild, LogsTheTimesItTook) {
 
 } // namespace
 
-extern "C" int gettimeofday(timeval* now, void* /*zone*/) noexcept {
-    *now = {100, 0};
+extern "C" int gettimeofday(timeval* tv, void* /*tz*/) noexcept {
+    *tv = {100, 0};
     if (!gClock.empty()) {
-        *now = gClock.front();
+        *tv = gClock.front();
         gClock.pop_front();
     }
     return 0;
