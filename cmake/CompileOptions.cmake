@@ -22,3 +22,10 @@ if(MORVANE_SANITIZED)
     -fsanitize=address,undefined -fno-sanitize-recover=all -fno-omit-frame-pointer)
   target_link_options(morvane_options INTERFACE -fsanitize=address,undefined)
 endif()
+
+if(MORVANE_FUZZ)
+  set(fuzz_options -fsanitize=address,undefined,fuzzer-no-link -fno-sanitize-recover=all
+    -fprofile-instr-generate -fcoverage-mapping)
+  target_compile_options(morvane_options INTERFACE ${fuzz_options} -O1 -fno-omit-frame-pointer)
+  target_link_options(morvane_options INTERFACE ${fuzz_options})
+endif()
