@@ -100,6 +100,12 @@ bool fails(Kind kind, const void* caller) {
     return true;
 }
 
+// Whether a block is the reserve that the C++ runtime, a part of the executable, keeps from before main on
+// for exceptions that find no memory. What becomes of a program without it is the runtime's business.
+bool isReserveForExceptions(std::size_t size) {
+    return gPlan.calls[kStat] == 0 && size > 16384;
+}
+
 template <typename Function>
 Function* real(Function* /*own*/, const char* name) {
     return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
@@ -213,7 +219,7 @@ void* __libc_malloc(std::size_t size);
 void* __libc_calloc(std::size_t count, std::size_t size);
 
 void* malloc(std::size_t size) noexcept {
-    if (OWN_CALL_FAILS(kAllocation)) {
+    if (!isReserveForExceptions(size) && OWN_CALL_FAILS(kAllocation)) {
         errno = ENOMEM;
         return nullptr;
     }
