@@ -326,5 +326,10 @@ int main(int argc, char** argv) {
                      "MOST: how many of the calls of one kind fail in turn\n";
         return 2;
     }
-    return runMatrix({arguments[0], arguments[1], arguments[2], arguments[3]}, std::stoul(arguments[4]));
+    try {
+        return runMatrix({arguments[0], arguments[1], arguments[2], arguments[3]}, std::stoul(arguments[4]));
+    } catch (const std::exception& exception) {
+        std::cerr << exception.what() << "\n";
+        return 2;
+    }
 }

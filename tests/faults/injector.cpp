@@ -155,11 +155,10 @@ int findProgram(dl_phdr_info* info, std::size_t /*size*/, void* /*data*/) {
 void takePlan(const char* text) {
     for (unsigned kind = 0; kind < kKinds; ++kind) {
         const std::size_t length = std::strlen(kNames[kind]);
-        char mode[5] = {};
-        if (std::strncmp(text, kNames[kind], length) == 0 &&
-            std::sscanf(text + length, ":%4[a-z]:%lu", mode, &gPlan.number) == 2) {
+        if (std::strncmp(text, kNames[kind], length) == 0 && text[length] == ':') {
             gPlan.kind = static_cast<Kind>(kind);
-            gPlan.isFromThenOn = std::strcmp(mode, "from") == 0;
+            gPlan.isFromThenOn = std::strncmp(text + length, ":from:", 6) == 0;
+            gPlan.number = std::strtoul(text + length + 6, nullptr, 10); // ":only:" is as long
         }
     }
     if (gPlan.kind == kKinds) {
