@@ -1,0 +1,435 @@
+#include "view/diff.hpp"
+
+#include "view/escape.hpp"
+#include "view/words.hpp"
+
+#include <algorithm>
+#include <map>
+#include <string_view>
+#include <unordered_map>
+#include <utility>
+
+namespace view {
+
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+struct ListedPath {
+    PathView view;
+    std::optional<std::string> identifier;
+};
+
+using PathsByPlace = std::map<std::string, std::vector<ListedPath>>;
+
+std::optional<std::string> readIdentifier(const Identifier& identifier) {
+    if (identifier.kind == IdentifierKind::None) {
+        return std::nullopt;
+    }
+    return identifier.text;
+}
+
+// Every listed path by what stays the same when its device gets another name.
+PathsByPlace pathsByPlace(const Model& model) {
+    PathsByPlace places;
+    for (std::size_t i = 0; i < model.fc.paths.size(); ++i) {
+        const FcPath& path = model.fc.paths[i];
+        places["fc\n" + path.initiator + '\n' + path.targetPort + '\n' + path.fcpLun].push_back(
+            {describe(model, {Sighting::Place::FcPath, i, 0}), readIdentifier(path.identifier)});
+    }
+    for (std::size_t i = 0; i < model.iscsi.paths.size(); ++i) {
+        const IscsiPath& path = model.iscsi.paths[i];
+        places["iscsi\n" + path.initiatorIqn + '\n' + path.initiatorPort + '\n' + path.targetIqn + '\n' +
+               path.targetAddress + '\n' + std::to_string(path.lun)]
+            .push_back(
+                {describe(model, {Sighting::Place::IscsiPath, i, 0}), readIdentifier(path.identifier)});
+    }
+    return places;
+}
+
+// Takes away from both lists what they have in common.
+void cancel(std::vector<ListedPath>& before, std::vector<ListedPath>& after) {
+    for (auto path = before.begin(); path != before.end();) {
+        const auto same = std::find_if(after.begin(), after.end(), [&path](const ListedPath& other) {
+            return other.identifier == path->identifier;
+        });
+        if (same == after.end()) {
+            ++path;
+        } else {
+            after.erase(same);
+            path = before.erase(path);
+        }
+    }
+}
+
+std::unordered_map<std::string, std::size_t> unlistedCounts(const Model& model) {
+    std::unordered_map<std::string, std::size_t> counts;
+    for (const Adapter& adapter : model.fc.adapters) {
+        for (const UnlistedLun& lun : adapter.unlisted) {
+            ++counts[lun.identifier.text];
+        }
+    }
+    return counts;
+}
+
+void addPath(std::vector<PathDifference>& list, const ListedPath& path,
+             std::unordered_map<std::string, std::size_t>& unlistedElsewhere) {
+    PathDifference difference{path.view, path.identifier.value_or(""), false};
+    if (path.view.tree == Tree::Fc) {
+        std::size_t& left = unlistedElsewhere[difference.identifier];
+        difference.isKnownUnlisted = left > 0;
+        left -= left > 0 ? 1 : 0;
+    }
+    list.push_back(std::move(difference));
+}
+
+void comparePaths(Difference& difference, const Model& before, const Model& after) {
+    PathsByPlace old = pathsByPlace(before);
+    PathsByPlace now = pathsByPlace(after);
+    auto unlistedBefore = unlistedCounts(before);
+    auto unlistedAfter = unlistedCounts(after);
+    for (auto& [place, oldPaths] : old) {
+        std::vector<ListedPath>& newPaths = now[place];
+        cancel(oldPaths, newPaths);
+        const std::size_t changed = std::min(oldPaths.size(), newPaths.size());
+        for (std::size_t i = 0; i < changed; ++i) {
+            difference.identityChanges.push_back(
+                {newPaths[i].view, oldPaths[i].identifier, newPaths[i].identifier});
+        }
+        for (std::size_t i = changed; i < oldPaths.size(); ++i) {
+            addPath(difference.lostPaths, oldPaths[i], unlistedAfter);
+        }
+        newPaths.erase(newPaths.begin(), newPaths.begin() + static_cast<std::ptrdiff_t>(changed));
+    }
+    for (const auto& [place, newPaths] : now) {
+        for (const ListedPath& path : newPaths) {
+            addPath(difference.newPaths, path, unlistedBefore);
+        }
+    }
+}
+
+void compareCounts(Difference& difference, const Model& before, const Model& after) {
+    std::unordered_map<std::string_view, const Lun*> now;
+    for (const Lun& lun : after.luns) {
+        now[lun.identifier.text] = &lun;
+    }
+    std::unordered_map<std::string_view, const Lun*> old;
+    for (const Lun& lun : before.luns) {
+        old[lun.identifier.text] = &lun;
+        const auto found = now.find(lun.identifier.text);
+        const std::size_t count = found == now.end() ? 0 : found->second->devices.size();
+        if (count != lun.devices.size()) {
+            difference.pathCounts.push_back({lun.identifier.text, lun.facts, lun.devices.size(), count});
+        }
+    }
+    for (const Lun& lun : after.luns) {
+        if (!old.contains(lun.identifier.text)) {
+            difference.pathCounts.push_back({lun.identifier.text, lun.facts, 0, lun.devices.size()});
+        }
+    }
+}
+
+// Devices by what stays the same when the kernel numbers its disks anew; the values are what is shown.
+template <typename Shown>
+using ByKey = std::multimap<std::string, Shown>;
+
+template <typename Shown>
+void subtract(const ByKey<Shown>& from, const ByKey<Shown>& what, std::vector<Shown>& rest) {
+    for (auto key = from.begin(); key != from.end();) {
+        const auto end = from.upper_bound(key->first);
+        std::size_t common = what.count(key->first);
+        for (; key != end; ++key) {
+            if (common > 0) {
+                --common;
+            } else {
+                rest.push_back(key->second);
+            }
+        }
+    }
+}
+
+ByKey<DeviceDifference> directByKey(const Model& model) {
+    ByKey<DeviceDifference> devices;
+    for (const DirectDevice& direct : model.direct.devices) {
+        if (direct.identifier.kind == IdentifierKind::HostName) {
+            devices.emplace(direct.device, DeviceDifference{direct.device, {}});
+        } else {
+            devices.emplace("id\n" + direct.identifier.text,
+                            DeviceDifference{direct.device, direct.identifier.text});
+        }
+    }
+    return devices;
+}
+
+// The disk that a partition's device name belongs to, and the partition's number: /dev/sdb1 is number 1 of
+// /dev/sdb, /dev/nvme0n1p2 number 2 of /dev/nvme0n1.
+std::pair<std::string, std::string> splitPartition(const std::string& device) {
+    const std::size_t lastNonDigit = device.find_last_not_of("0123456789");
+    if (lastNonDigit == std::string::npos || lastNonDigit + 1 == device.size()) {
+        return {device, {}};
+    }
+    const std::string number = device.substr(lastNonDigit + 1);
+    std::string disk = device.substr(0, lastNonDigit + 1);
+    if (disk.size() > 1 && disk.back() == 'p' && disk[disk.size() - 2] >= '0' &&
+        disk[disk.size() - 2] <= '9') {
+        disk.pop_back();
+    }
+    return {disk, number};
+}
+
+ByKey<std::string> logicalByKey(const Model& model) {
+    std::unordered_map<std::string_view, std::string_view> identifierOfDisk;
+    for (const Lun& lun : model.luns) {
+        for (const std::string& device : lun.devices) {
+            identifierOfDisk[device] = lun.identifier.text;
+        }
+    }
+    ByKey<std::string> devices;
+    for (const std::string& device : model.logical.devices) {
+        const auto [disk, number] = splitPartition(device);
+        const auto known = identifierOfDisk.find(disk);
+        devices.emplace(known == identifierOfDisk.end() ? device
+                                                        : "id\n" + std::string(known->second) + '\n' + number,
+                        device);
+    }
+    return devices;
+}
+
+void addWarnings(Difference& difference, const Model& model, std::string_view which) {
+    if (!model.log.complete) {
+        difference.warnings.push_back(std::string(which) +
+                                      " log is not whole: what it does not reach counts as lost");
+    }
+    const auto ended = [&](TreeState state, Tree tree) {
+        if (state == TreeState::Ended) {
+            difference.warnings.push_back(std::string(which) + " log's " + std::string(section(tree)) +
+                                          " tree was ended early: what it does not list counts as lost");
+        }
+    };
+    ended(model.fc.state, Tree::Fc);
+    ended(model.direct.state, Tree::Direct);
+    ended(model.logical.state, Tree::Logical);
+    if (model.log.unknownPieces > 0) {
+        difference.warnings.push_back(std::string(which) + " log holds " +
+                                      counted(model.log.unknownPieces, "piece") +
+                                      " that are none of Morvane's texts");
+    }
+}
+
+std::string placeWords(const PathView& path) {
+    return printable(path.initiator) + " -> " + printable(path.target) + " LUN " + path.lun;
+}
+
+void writePaths(std::ostream& output, const Style& style, std::string_view heading,
+                const std::vector<PathDifference>& paths, std::string_view unlistedWords) {
+    if (paths.empty()) {
+        return;
+    }
+    writeHeading(output, style, std::string(heading) + " (" + std::to_string(paths.size()) + ")");
+    Columns columns;
+    for (const PathDifference& difference : paths) {
+        columns.add({placeWords(difference.path), printable(difference.path.device),
+                     printable(difference.identifier),
+                     difference.isKnownUnlisted ? std::string(unlistedWords) : ""});
+    }
+    columns.write(output, "  ");
+}
+
+void writeList(std::ostream& output, const Style& style, std::string_view heading,
+               const std::vector<DeviceDifference>& devices) {
+    if (devices.empty()) {
+        return;
+    }
+    writeHeading(output, style, std::string(heading) + " (" + std::to_string(devices.size()) + ")");
+    Columns columns;
+    for (const DeviceDifference& difference : devices) {
+        columns.add({printable(difference.device), printable(difference.identifier)});
+    }
+    columns.write(output, "  ");
+}
+
+std::vector<DeviceDifference> named(const std::vector<std::string>& devices) {
+    std::vector<DeviceDifference> list;
+    list.reserve(devices.size());
+    for (const std::string& device : devices) {
+        list.push_back({device, {}});
+    }
+    return list;
+}
+
+Json pathJson(const PathView& path) {
+    return {{"tree", name(path.tree)},
+            {"initiator", printable(path.initiator)},
+            {"target", printable(path.target)},
+            {"lun", printable(path.lun)},
+            {"device", printable(path.device)}};
+}
+
+Json identifierJson(const std::optional<std::string>& identifier) {
+    return identifier ? Json(printable(*identifier)) : Json();
+}
+
+Json pathsJson(const std::vector<PathDifference>& paths) {
+    Json list = Json::array();
+    for (const PathDifference& difference : paths) {
+        Json json = pathJson(difference.path);
+        json["identifier"] = difference.identifier.empty() ? Json() : Json(printable(difference.identifier));
+        json["knownUnlisted"] = difference.isKnownUnlisted;
+        list.push_back(std::move(json));
+    }
+    return list;
+}
+
+Json devicesJson(const std::vector<DeviceDifference>& devices) {
+    Json list = Json::array();
+    for (const DeviceDifference& difference : devices) {
+        list.push_back({{"device", printable(difference.device)},
+                        {"identifier",
+                         difference.identifier.empty() ? Json() : Json(printable(difference.identifier))}});
+    }
+    return list;
+}
+
+} // namespace
+
+bool Difference::isEmpty() const {
+    return identityChanges.empty() && lostPaths.empty() && newPaths.empty() && pathCounts.empty() &&
+           lostDirect.empty() && newDirect.empty() && lostLogical.empty() && newLogical.empty() &&
+           !powerPathBefore;
+}
+
+Difference compare(const Model& before, const Model& after) {
+    Difference difference;
+    if (!before.host.empty() && !after.host.empty() && before.host != after.host) {
+        difference.warnings.push_back("the logs are of two hosts: " + printable(before.host) + " and " +
+                                      printable(after.host));
+    }
+    addWarnings(difference, before, "the old");
+    addWarnings(difference, after, "the new");
+    comparePaths(difference, before, after);
+    compareCounts(difference, before, after);
+    const ByKey<DeviceDifference> directBefore = directByKey(before);
+    const ByKey<DeviceDifference> directAfter = directByKey(after);
+    subtract(directBefore, directAfter, difference.lostDirect);
+    subtract(directAfter, directBefore, difference.newDirect);
+    const ByKey<std::string> logicalBefore = logicalByKey(before);
+    const ByKey<std::string> logicalAfter = logicalByKey(after);
+    subtract(logicalBefore, logicalAfter, difference.lostLogical);
+    subtract(logicalAfter, logicalBefore, difference.newLogical);
+    if (before.multipath.state != after.multipath.state &&
+        before.multipath.state != PowerPathState::Unknown &&
+        after.multipath.state != PowerPathState::Unknown) {
+        difference.powerPathBefore = before.multipath.state;
+        difference.powerPathAfter = after.multipath.state;
+    }
+    return difference;
+}
+
+void writeText(std::ostream& output, const Difference& difference, const Style& style) {
+    for (const std::string& warning : difference.warnings) {
+        output << "warning: " << warning << '\n';
+    }
+    if (difference.isEmpty()) {
+        output << style.good << "No difference." << style.end << '\n';
+        return;
+    }
+    const auto dangerous = std::count_if(difference.identityChanges.begin(), difference.identityChanges.end(),
+                                         [](const IdentityChange& change) { return change.isDangerous(); });
+    if (dangerous > 0) {
+        output << '\n'
+               << style.problem << "DANGER: another LUN behind the same initiator, target and LUN number ("
+               << dangerous << ')' << style.end << '\n';
+        for (const IdentityChange& change : difference.identityChanges) {
+            if (change.isDangerous()) {
+                output << "  " << placeWords(change.path) << "  " << printable(change.path.device)
+                       << "\n    was " << printable(*change.before) << "\n    is  "
+                       << printable(*change.after) << '\n';
+            }
+        }
+    }
+    if (static_cast<std::size_t>(dangerous) < difference.identityChanges.size()) {
+        writeHeading(
+            output, style,
+            "Identifier readable in one log only (" +
+                std::to_string(difference.identityChanges.size() - static_cast<std::size_t>(dangerous)) +
+                ")");
+        for (const IdentityChange& change : difference.identityChanges) {
+            if (!change.isDangerous()) {
+                output << "  " << placeWords(change.path) << "  " << printable(change.path.device)
+                       << (change.before ? "  can no longer be read, was " : "  can be read now: ")
+                       << printable(change.before ? *change.before : change.after.value_or("")) << '\n';
+            }
+        }
+    }
+    writePaths(output, style, "Lost paths", difference.lostPaths,
+               "the new log identified such a device without listing it");
+    writePaths(output, style, "New paths", difference.newPaths,
+               "the old log identified such a device without listing it");
+    if (!difference.pathCounts.empty()) {
+        writeHeading(output, style,
+                     "LUNs with another number of paths (" + std::to_string(difference.pathCounts.size()) +
+                         ")");
+        Columns columns;
+        for (const PathCountChange& change : difference.pathCounts) {
+            std::string verdict = change.after < change.before ? "fewer" : "more";
+            if (change.after == 0) {
+                verdict = "gone";
+            } else if (change.before == 0) {
+                verdict = "new";
+            }
+            columns.add({verdict, std::to_string(change.before) + " -> " + std::to_string(change.after),
+                         printable(change.identifier), printable(change.facts.vendor),
+                         printable(change.facts.product)});
+        }
+        columns.write(output, "  ");
+    }
+    writeList(output, style, "Lost direct disks", difference.lostDirect);
+    writeList(output, style, "New direct disks", difference.newDirect);
+    writeList(output, style, "Lost logical devices", named(difference.lostLogical));
+    writeList(output, style, "New logical devices", named(difference.newLogical));
+    if (difference.powerPathBefore && difference.powerPathAfter) {
+        writeHeading(output, style,
+                     "PowerPath was " + std::string(name(*difference.powerPathBefore)) + ", is " +
+                         std::string(name(*difference.powerPathAfter)));
+    }
+}
+
+nlohmann::ordered_json toJson(const Difference& difference) {
+    Json changes = Json::array();
+    for (const IdentityChange& change : difference.identityChanges) {
+        Json json = pathJson(change.path);
+        json["before"] = identifierJson(change.before);
+        json["after"] = identifierJson(change.after);
+        json["dangerous"] = change.isDangerous();
+        changes.push_back(std::move(json));
+    }
+    Json counts = Json::array();
+    for (const PathCountChange& change : difference.pathCounts) {
+        counts.push_back({{"identifier", printable(change.identifier)},
+                          {"before", change.before},
+                          {"after", change.after}});
+    }
+    Json warnings = Json::array();
+    for (const std::string& warning : difference.warnings) {
+        warnings.push_back(warning);
+    }
+    Json powerPath;
+    if (difference.powerPathBefore && difference.powerPathAfter) {
+        powerPath = {{"before", name(*difference.powerPathBefore)},
+                     {"after", name(*difference.powerPathAfter)}};
+    }
+    return {{"kind", "diff"},
+            {"same", difference.isEmpty()},
+            {"warnings", warnings},
+            {"identityChanges", std::move(changes)},
+            {"lostPaths", pathsJson(difference.lostPaths)},
+            {"newPaths", pathsJson(difference.newPaths)},
+            {"pathCounts", std::move(counts)},
+            {"lostDirect", devicesJson(difference.lostDirect)},
+            {"newDirect", devicesJson(difference.newDirect)},
+            {"lostLogical", devicesJson(named(difference.lostLogical))},
+            {"newLogical", devicesJson(named(difference.newLogical))},
+            {"powerPath", powerPath}};
+}
+
+} // namespace view

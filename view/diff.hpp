@@ -1,0 +1,71 @@
+#pragma once
+
+#include "view/model.hpp"
+#include "view/path_view.hpp"
+#include "view/text_layout.hpp"
+
+#include <nlohmann/json.hpp>
+
+#include <cstddef>
+#include <optional>
+#include <ostream>
+#include <string>
+#include <vector>
+
+namespace view {
+
+// A path that only one of two logs lists.
+struct PathDifference {
+    PathView path;
+    std::string identifier;
+    bool isKnownUnlisted = false; // the other log identified a device of this identity without listing it
+};
+
+// A path that both logs list, with different identities behind it.
+struct IdentityChange {
+    PathView path;                     // as the new log has it
+    std::optional<std::string> before; // nothing when it could not be read
+    std::optional<std::string> after;
+
+    // Whether two different LUNs stood behind the path; otherwise one of the logs has no identifier.
+    [[nodiscard]] bool isDangerous() const { return before && after; }
+};
+
+struct PathCountChange {
+    std::string identifier;
+    DeviceFacts facts;
+    std::size_t before = 0;
+    std::size_t after = 0;
+};
+
+// A direct or logical device that only one of two logs lists.
+struct DeviceDifference {
+    std::string device;
+    std::string identifier; // empty when it has none of its own
+};
+
+// How two runs on one host differ. A device that only got another name is no difference.
+struct Difference {
+    std::vector<std::string> warnings; // why the logs may not compare well
+    std::vector<IdentityChange> identityChanges;
+    std::vector<PathDifference> lostPaths;
+    std::vector<PathDifference> newPaths;
+    std::vector<PathCountChange> pathCounts; // of LUNs that have more or fewer paths, none included
+    std::vector<DeviceDifference> lostDirect;
+    std::vector<DeviceDifference> newDirect;
+    std::vector<std::string> lostLogical;
+    std::vector<std::string> newLogical;
+    std::optional<PowerPathState> powerPathBefore; // both set when they differ
+    std::optional<PowerPathState> powerPathAfter;
+
+    [[nodiscard]] bool isEmpty() const;
+};
+
+Difference compare(const Model& before, const Model& after);
+
+void writeText(std::ostream& output, const Difference& difference, const Style& style);
+
+// A JSON document of kind "diff".
+nlohmann::ordered_json toJson(const Difference& difference);
+
+} // namespace view

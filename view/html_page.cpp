@@ -1,0 +1,36 @@
+#include "view/html_page.hpp"
+
+#include "view/page_template.hpp"
+
+#include <string_view>
+
+namespace view {
+
+namespace {
+
+constexpr std::string_view documentMark = "/*DOCUMENT*/";
+
+// JSON that cannot end the script element it stands in.
+std::string forScript(const nlohmann::ordered_json& document) {
+    const std::string json = document.dump();
+    std::string safe;
+    safe.reserve(json.size());
+    for (const char c : json) {
+        if (c == '<') {
+            safe += "\\u003c";
+        } else {
+            safe += c;
+        }
+    }
+    return safe;
+}
+
+} // namespace
+
+void writePage(std::ostream& output, const nlohmann::ordered_json& document) {
+    const std::size_t mark = pageTemplate.find(documentMark);
+    output << pageTemplate.substr(0, mark) << forScript(document)
+           << pageTemplate.substr(mark + documentMark.size());
+}
+
+} // namespace view

@@ -1,0 +1,14 @@
+#pragma once
+
+#include <nlohmann/json.hpp>
+
+#include <ostream>
+#include <string>
+
+namespace view {
+
+// Writes a page that shows a JSON document by itself, without the network. The document has "title",
+// "reports" (a list of {"name", "report"}, the report of kind "report") and "san" (of kind "san", or null).
+void writePage(std::ostream& output, const nlohmann::ordered_json& document);
+
+} // namespace view

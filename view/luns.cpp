@@ -1,0 +1,115 @@
+#include "view/luns.hpp"
+
+#include <algorithm>
+#include <string>
+#include <unordered_map>
+#include <unordered_set>
+#include <utility>
+
+namespace view {
+
+namespace {
+
+// Builds the groups one sighting at a time.
+class LunGroups {
+public:
+    explicit LunGroups(Model& model) : model_(model) {}
+
+    void addAll() {
+        for (std::size_t i = 0; i < model_.fc.paths.size(); ++i) {
+            const FcPath& path = model_.fc.paths[i];
+            add({Sighting::Place::FcPath, i, 0}, path.identifier, path.facts, path.device);
+            addPlace(path.identifier.text, std::to_string(path.adapter) + ' ' + path.targetPort, path.fcpLun);
+        }
+        for (std::size_t i = 0; i < model_.fc.adapters.size(); ++i) {
+            const Adapter& adapter = model_.fc.adapters[i];
+            for (std::size_t k = 0; k < adapter.unlisted.size(); ++k) {
+                const UnlistedLun& lun = adapter.unlisted[k];
+                add({Sighting::Place::Unlisted, k, i}, lun.identifier, lun.facts, lun.device);
+            }
+        }
+        for (std::size_t i = 0; i < model_.iscsi.paths.size(); ++i) {
+            const IscsiPath& path = model_.iscsi.paths[i];
+            if (path.identifier.kind != IdentifierKind::None) {
+                add({Sighting::Place::IscsiPath, i, 0}, path.identifier, {}, path.device);
+                addPlace(path.identifier.text,
+                         path.initiatorPort + ' ' + path.targetIqn + ' ' + path.targetAddress,
+                         std::to_string(path.lun));
+            }
+        }
+        for (std::size_t i = 0; i < model_.direct.devices.size(); ++i) {
+            const DirectDevice& direct = model_.direct.devices[i];
+            if (direct.identifier.kind != IdentifierKind::HostName) {
+                add({Sighting::Place::DirectDevice, i, 0}, direct.identifier, {}, direct.device);
+            }
+        }
+    }
+
+    void judge() {
+        for (Lun& lun : model_.luns) {
+            const std::string& identifier = lun.identifier.text;
+            if (!isTelling(identifier)) {
+                lun.notUnique = identifier.empty()
+                                    ? "an empty identifier is none"
+                                    : "blanks or zeros are no identifier; a device that refuses page "
+                                      "0x83 is given them";
+            } else if (shared_.contains(identifier)) {
+                lun.notUnique = "several LUN numbers of one target carry it";
+            }
+            if (!lun.notUnique.empty()) {
+                model_.problems.push_back(
+                    {Severity::Problem, ProblemKind::IdentifierNotUnique, Tree::Run, identifier,
+                     "not unique, " + std::to_string(lun.devices.size()) +
+                         (lun.devices.size() == 1 ? " device carries" : " devices carry") +
+                         " it: " + lun.notUnique,
+                     0});
+            }
+        }
+    }
+
+private:
+    void add(Sighting sighting, const Identifier& identifier, const DeviceFacts& facts,
+             const std::string& device) {
+        const auto [found, isNew] = lunByIdentifier_.try_emplace(identifier.text, model_.luns.size());
+        if (isNew) {
+            model_.luns.emplace_back();
+            model_.luns.back().identifier = identifier;
+            model_.luns.back().facts = facts;
+        }
+        Lun& lun = model_.luns[found->second];
+        lun.sightings.push_back(sighting);
+        if (devices_.emplace(identifier.text + '\n' + device).second) {
+            lun.devices.push_back(device);
+        }
+    }
+
+    // Notes a LUN number at which a target port shows the identifier.
+    void addPlace(const std::string& identifier, const std::string& target, const std::string& lun) {
+        const auto [found, isNew] = lunByPlace_.try_emplace(identifier + '\n' + target, lun);
+        if (!isNew && found->second != lun) {
+            shared_.insert(identifier);
+        }
+    }
+
+    Model& model_;
+    std::unordered_map<std::string, std::size_t> lunByIdentifier_;
+    std::unordered_set<std::string> devices_;
+    std::unordered_map<std::string, std::string> lunByPlace_;
+    std::unordered_set<std::string> shared_;
+};
+
+} // namespace
+
+bool isTelling(std::string_view identifier) {
+    return identifier.find_first_not_of("0 ") != std::string_view::npos;
+}
+
+void groupLuns(Model& model) {
+    LunGroups groups(model);
+    groups.addAll();
+    groups.judge();
+    std::stable_sort(model.problems.begin(), model.problems.end(),
+                     [](const Problem& a, const Problem& b) { return a.severity < b.severity; });
+}
+
+} // namespace view

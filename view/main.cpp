@@ -1,0 +1,226 @@
+#include "view/diff.hpp"
+#include "view/escape.hpp"
+#include "view/html_page.hpp"
+#include "view/json_report.hpp"
+#include "view/log_reader.hpp"
+#include "view/san.hpp"
+#include "view/text_report.hpp"
+
+#include <CLI/CLI.hpp>
+#include <nlohmann/json.hpp>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdlib>
+#include <exception>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <iostream>
+#include <stdexcept>
+#include <string>
+#include <system_error>
+#include <vector>
+
+namespace {
+
+constexpr int exitSame = 0;
+constexpr int exitDifferent = 1;
+constexpr int exitTrouble = 2;
+
+// What stops the program, in a sentence for its user.
+class Trouble : public std::runtime_error {
+public:
+    using std::runtime_error::runtime_error;
+};
+
+std::string systemError() {
+    return std::system_category().message(errno);
+}
+
+view::Model openLog(const std::string& path) {
+    view::Model model;
+    if (path == "-") {
+        model = view::readLog(std::cin, "standard input");
+    } else {
+        std::error_code ignored;
+        if (std::filesystem::is_directory(path, ignored)) {
+            throw Trouble(path + ": is a folder; the log is the file Morvane.log in it");
+        }
+        errno = 0;
+        std::ifstream file(path, std::ios::binary);
+        if (!file) {
+            throw Trouble(path + ": " + systemError());
+        }
+        model = view::readLog(file, path);
+        if (file.bad()) {
+            throw Trouble(path + ": " + systemError());
+        }
+    }
+    if (model.log.bytes == 0) {
+        throw Trouble(path + ": the log is empty");
+    }
+    if (model.log.knownTexts == 0 || model.log.unknownPieces > model.log.knownTexts) {
+        throw Trouble(path + ": is not a Morvane log");
+    }
+    return model;
+}
+
+void warnOf(const view::Model& model) {
+    for (const std::string& warning : view::logWarnings(model.log)) {
+        std::cerr << "morvane-view: warning: " << model.log.name << ": " << warning << '\n';
+    }
+}
+
+void writeFile(const std::string& path, const std::function<void(std::ostream&)>& write) {
+    if (path == "-") {
+        write(std::cout);
+        return;
+    }
+    errno = 0;
+    std::ofstream file(path, std::ios::binary);
+    if (file) {
+        write(file);
+        file.flush();
+    }
+    if (!file) {
+        throw Trouble(path + ": " + systemError());
+    }
+}
+
+nlohmann::ordered_json named(const std::string& name, const view::Model& model) {
+    return {{"name", name}, {"report", view::toJson(model)}};
+}
+
+view::Style outputStyle() {
+    const char* noColour = std::getenv("NO_COLOR");
+    return view::Style::of((noColour == nullptr || *noColour == '\0') && isatty(STDOUT_FILENO) == 1);
+}
+
+struct Options {
+    std::string log = "./MorvaneLogs/Morvane.log";
+    std::string before;
+    std::string after;
+    std::vector<std::string> logs;
+    std::string page;
+    bool json = false;
+};
+
+int report(const Options& options) {
+    const view::Model model = openLog(options.log);
+    if (!options.page.empty()) {
+        const std::string host = model.host.empty() ? "an unnamed host" : view::printable(model.host);
+        nlohmann::ordered_json reports = nlohmann::ordered_json::array();
+        reports.push_back(named(host, model));
+        const nlohmann::ordered_json document = {
+            {"title", "Storage paths of " + host}, {"reports", std::move(reports)}, {"san", nullptr}};
+        writeFile(options.page, [&](std::ostream& output) { view::writePage(output, document); });
+    }
+    if (options.json) {
+        std::cout << view::toJson(model).dump(2) << '\n';
+    }
+    if (options.json || !options.page.empty()) {
+        warnOf(model);
+    } else {
+        view::writeText(std::cout, model, outputStyle());
+    }
+    return exitSame;
+}
+
+int diff(const Options& options) {
+    const view::Difference difference = view::compare(openLog(options.before), openLog(options.after));
+    if (options.json) {
+        std::cout << view::toJson(difference).dump(2) << '\n';
+    } else {
+        view::writeText(std::cout, difference, outputStyle());
+    }
+    return difference.isEmpty() ? exitSame : exitDifferent;
+}
+
+int san(const Options& options) {
+    std::vector<view::Model> reports;
+    for (const std::string& log : options.logs) {
+        reports.push_back(openLog(log));
+        warnOf(reports.back());
+    }
+    const view::San joined = view::join(reports);
+    if (!options.page.empty()) {
+        nlohmann::ordered_json list = nlohmann::ordered_json::array();
+        const nlohmann::ordered_json summary = view::toJson(joined);
+        for (std::size_t i = 0; i < reports.size(); ++i) {
+            list.push_back(named(summary["hosts"][i]["name"], reports[i]));
+        }
+        const nlohmann::ordered_json document = {
+            {"title", "SAN view of " + std::to_string(reports.size()) + " logs"},
+            {"reports", std::move(list)},
+            {"san", summary}};
+        writeFile(options.page, [&](std::ostream& output) { view::writePage(output, document); });
+    }
+    if (options.json) {
+        std::cout << view::toJson(joined).dump(2) << '\n';
+    } else if (options.page.empty()) {
+        view::writeText(std::cout, joined, outputStyle());
+    }
+    return exitSame;
+}
+
+constexpr const char* examples = R"(Examples:
+  morvane-view                               read ./MorvaneLogs/Morvane.log
+  ssh db1 cat MorvaneLogs/Morvane.log | morvane-view -
+  morvane-view --html paths.html Morvane.log
+  morvane-view --json Morvane.log | jq '.luns[] | select(.pathCount < 2)'
+  morvane-view diff before.log after.log     exit status 0 same, 1 different, 2 trouble
+  morvane-view san --html san.html logs/*/Morvane.log)";
+
+int run(int argc, char** argv) {
+    Options options;
+    CLI::App app{
+        "Reads the logs of morvane: the storage paths of a host, what is wrong with them, what changed.",
+        "morvane-view"};
+    app.footer(examples);
+    app.set_version_flag("--version", MORVANE_VERSION);
+    app.add_option("LOG", options.log, "the log to read, - for standard input")->capture_default_str();
+    app.add_flag("--json", options.json, "write JSON instead of text");
+    app.add_option("--html", options.page, "write a page for the browser to FILE")->type_name("FILE");
+
+    CLI::App* diffCommand = app.add_subcommand("diff", "compare two logs of a host");
+    diffCommand->add_option("OLD", options.before, "the earlier log")->required();
+    diffCommand->add_option("NEW", options.after, "the later log")->required();
+    diffCommand->add_flag("--json", options.json, "write JSON instead of text");
+
+    CLI::App* sanCommand = app.add_subcommand("san", "show the logs of many hosts as one view");
+    sanCommand->add_option("LOG", options.logs, "the hosts' logs")->required();
+    sanCommand->add_flag("--json", options.json, "write JSON instead of text");
+    sanCommand->add_option("--html", options.page, "write a page for the browser to FILE")->type_name("FILE");
+
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::ParseError& error) {
+        return app.exit(error) == 0 ? exitSame : exitTrouble;
+    }
+    int status = exitSame;
+    if (*diffCommand) {
+        status = diff(options);
+    } else if (*sanCommand) {
+        status = san(options);
+    } else {
+        status = report(options);
+    }
+    std::cout.flush();
+    if (!std::cout) {
+        throw Trouble("standard output: the report could not be written");
+    }
+    return status;
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    try {
+        std::ios::sync_with_stdio(false);
+        return run(argc, argv);
+    } catch (const std::exception& error) {
+        std::cerr << "morvane-view: " << error.what() << '\n';
+    }
+    return exitTrouble;
+}

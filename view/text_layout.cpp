@@ -1,0 +1,54 @@
+#include "view/text_layout.hpp"
+
+#include <algorithm>
+#include <cstddef>
+#include <utility>
+
+namespace view {
+
+namespace {
+
+// The number of characters in well-formed UTF-8.
+std::size_t width(std::string_view text) {
+    return static_cast<std::size_t>(std::count_if(
+        text.begin(), text.end(), [](char c) { return (static_cast<unsigned char>(c) & 0xc0U) != 0x80; }));
+}
+
+} // namespace
+
+Style Style::of(bool colour) {
+    if (!colour) {
+        return {};
+    }
+    return {"\033[1m", "\033[1;31m", "\033[32m", "\033[2m", "\033[0m"};
+}
+
+void Columns::add(std::vector<std::string> cells) {
+    lines_.push_back(std::move(cells));
+}
+
+void Columns::write(std::ostream& output, std::string_view indent) const {
+    std::vector<std::size_t> widths;
+    for (const std::vector<std::string>& cells : lines_) {
+        widths.resize(std::max(widths.size(), cells.size()));
+        for (std::size_t i = 0; i < cells.size(); ++i) {
+            widths[i] = std::max(widths[i], width(cells[i]));
+        }
+    }
+    for (const std::vector<std::string>& cells : lines_) {
+        std::string line(indent);
+        for (std::size_t i = 0; i < cells.size(); ++i) {
+            if (widths[i] > 0) {
+                line += cells[i] + std::string(widths[i] - width(cells[i]) + 2, ' ');
+            }
+        }
+        line.resize(line.find_last_not_of(' ') + 1);
+        output << line << '\n';
+    }
+}
+
+void writeHeading(std::ostream& output, const Style& style, std::string_view heading) {
+    output << '\n' << style.heading << heading << style.end << '\n';
+}
+
+} // namespace view

@@ -1,0 +1,63 @@
+#pragma once
+
+#include "view/known_texts.hpp"
+
+#include <array>
+#include <cstddef>
+#include <span>
+#include <string_view>
+#include <vector>
+
+namespace view {
+
+// A known text found at the start of some bytes of the log. The fields point into those bytes.
+struct TextMatch {
+    static constexpr std::size_t maximumFields = 5;
+
+    Text text = Text::Progress;
+    std::size_t length = 0; // bytes of the match, a line end not counted
+    std::array<std::string_view, maximumFields> fields;
+    std::size_t fieldCount = 0;
+};
+
+enum class MatchResult : unsigned char {
+    None,     // no known text starts here
+    Unending, // a text with a field of foreign bytes starts here, but its rest is missing: the field may hold
+              // a line end, so the text may go on in the next line
+    Found,
+};
+
+// Recognises Morvane's log texts by their printf formats.
+class TextMatcher {
+public:
+    explicit TextMatcher(std::span<const KnownText> texts);
+
+    // Looks for a known text at the start of `bytes`, which hold one line of the log, or several when a field
+    // went over a line end, without the last line end. Fills `match` when the result is Found.
+    [[nodiscard]] MatchResult match(std::string_view bytes, TextMatch& match) const;
+
+private:
+    enum class Field : unsigned char { None, Text, Decimal, Hex, Real, Pointer };
+
+    // A literal and the field after it.
+    struct Piece {
+        std::string_view literal;
+        Field field;
+    };
+
+    struct Pattern {
+        Text text;
+        bool endsLine;
+        bool mayRunOver; // a text field stands before a literal that must follow
+        std::vector<Piece> pieces;
+    };
+
+    static Pattern compile(const KnownText& known);
+    static Piece takePiece(std::string_view& format);
+    static bool matchPieces(const Pattern& pattern, std::size_t piece, std::string_view bytes, std::size_t at,
+                            TextMatch& match, int& attempts);
+
+    std::vector<std::vector<Pattern>> patternsByFirstByte_;
+};
+
+} // namespace view

@@ -1,0 +1,285 @@
+#include "view/text_report.hpp"
+
+#include "view/escape.hpp"
+#include "view/path_view.hpp"
+#include "view/words.hpp"
+
+#include <algorithm>
+#include <cstddef>
+#include <iomanip>
+#include <map>
+#include <sstream>
+#include <string_view>
+#include <utility>
+
+namespace view {
+
+namespace {
+
+std::string joinWords(const std::vector<std::string>& words) {
+    std::string joined;
+    for (const std::string& word : words) {
+        if (!word.empty()) {
+            joined += (joined.empty() ? "" : " ") + word;
+        }
+    }
+    return joined;
+}
+
+void writeTitle(std::ostream& output, const Model& model, const Style& style) {
+    const std::string host = model.host.empty() ? "an unnamed host" : printable(model.host);
+    output << style.heading << "Storage paths of " << host << style.end << ", " << printable(model.log.name)
+           << '\n';
+}
+
+void writeProblems(std::ostream& output, const Model& model, const Style& style) {
+    const auto firstNote =
+        std::find_if(model.problems.begin(), model.problems.end(),
+                     [](const Problem& problem) { return problem.severity == Severity::Note; });
+    const auto problems = static_cast<std::size_t>(firstNote - model.problems.begin());
+    if (problems == 0) {
+        output << '\n' << style.good << "No problems." << style.end << '\n';
+    }
+    for (std::size_t i = 0; i < model.problems.size(); ++i) {
+        const Problem& problem = model.problems[i];
+        if (i == 0 && problems > 0) {
+            output << '\n' << style.problem << "Problems (" << problems << ')' << style.end << '\n';
+        }
+        if (i == problems) {
+            writeHeading(output, style, "Notes (" + std::to_string(model.problems.size() - problems) + ")");
+        }
+        output << "  " << std::left << std::setw(11) << section(problem.tree) << printable(problem.subject)
+               << '\n'
+               << std::string(13, ' ') << printable(problem.cause);
+        if (problem.line > 0) {
+            output << style.faint << " (line " << problem.line << ')' << style.end;
+        }
+        output << '\n';
+    }
+}
+
+void writeWarnings(std::ostream& output, const LogFacts& log, const Style& style) {
+    const std::vector<std::string> warnings = logWarnings(log);
+    if (warnings.empty()) {
+        return;
+    }
+    writeHeading(output, style, "The log itself");
+    for (const std::string& warning : warnings) {
+        output << "  " << warning << '\n';
+    }
+}
+
+void writeLuns(std::ostream& output, const Model& model, const Style& style) {
+    if (model.luns.empty()) {
+        return;
+    }
+    writeHeading(output, style, "LUNs (" + std::to_string(model.luns.size()) + ")");
+    for (const Lun& lun : model.luns) {
+        const std::string identifier =
+            lun.identifier.text.empty() ? "(empty)" : printable(lun.identifier.text);
+        const std::string product = joinWords({printable(lun.facts.vendor), printable(lun.facts.product)});
+        output << "  " << style.heading << identifier << style.end << "  "
+               << counted(lun.devices.size(), "path");
+        if (!product.empty()) {
+            output << "  " << product;
+        }
+        if (!lun.facts.pseudoDevice.empty()) {
+            output << "  " << printable(lun.facts.pseudoDevice);
+        }
+        if (!lun.notUnique.empty()) {
+            output << "  " << style.problem << "NOT UNIQUE" << style.end;
+        }
+        output << '\n';
+        Columns columns;
+        for (const Sighting& sighting : lun.sightings) {
+            const PathView path = describe(model, sighting);
+            std::string way = printable(path.initiator) + " -> " + printable(path.target);
+            if (sighting.place == Sighting::Place::DirectDevice) {
+                way = "direct";
+            } else if (sighting.place == Sighting::Place::Unlisted) {
+                way = "not listed in the FC tree";
+            }
+            columns.add({printable(path.device), path.lun.empty() ? "" : "LUN " + path.lun, way});
+        }
+        columns.write(output, "    ");
+    }
+}
+
+std::string stateWords(TreeState state) {
+    switch (state) {
+    case TreeState::Absent:
+        return "not in the log";
+    case TreeState::Begun:
+        return "cut off";
+    case TreeState::Ended:
+        return "ended early";
+    default:
+        return {};
+    }
+}
+
+// The heading of a tree: its name, its size, and its state unless it is whole.
+void writeTreeHeading(std::ostream& output, const Style& style, std::string_view tree,
+                      const std::string& size, TreeState state) {
+    const std::string words = stateWords(state);
+    writeHeading(output, style,
+                 std::string(tree) + " (" + (words.empty() ? size : size + ", " + words) + ")");
+}
+
+std::string adapterWords(const Adapter& adapter) {
+    switch (adapter.state) {
+    case AdapterState::Failed:
+        return "FAILED: " + printable(adapter.cause);
+    case AdapterState::Unsupported:
+        return "not supported";
+    case AdapterState::Begun:
+        return "cut off";
+    default:
+        return {};
+    }
+}
+
+// Adapters with their ports and targets; the LUNs behind a target are counted.
+void writeFc(std::ostream& output, const Model& model, const Style& style) {
+    const FcTree& fc = model.fc;
+    writeTreeHeading(output, style, "Fibre Channel",
+                     counted(fc.adapters.size(), "adapter") + ", " + counted(fc.paths.size(), "path"),
+                     fc.state);
+    using Target = std::pair<std::string, std::string>; // node and port
+    using Targets = std::vector<std::pair<Target, std::size_t>>;
+    std::map<std::pair<std::size_t, std::string>, Targets> targetsOfPort;
+    for (const FcPath& path : fc.paths) {
+        Targets& targets = targetsOfPort[{path.adapter, path.initiator}];
+        const Target target{path.targetNode, path.targetPort};
+        auto found = std::find_if(targets.begin(), targets.end(),
+                                  [&target](const auto& known) { return known.first == target; });
+        if (found == targets.end()) {
+            found = targets.insert(targets.end(), {target, 0});
+        }
+        ++found->second;
+    }
+    for (std::size_t i = 0; i < fc.adapters.size(); ++i) {
+        const Adapter& adapter = fc.adapters[i];
+        output << "  adapter "
+               << joinWords({adapter.number ? "#" + std::to_string(*adapter.number) : "",
+                             printable(adapter.name), printable(adapter.manufacturer),
+                             printable(adapter.model), printable(adapter.node)});
+        const std::string state = adapterWords(adapter);
+        if (!state.empty()) {
+            output << "  " << style.problem << state << style.end;
+        }
+        output << '\n';
+        for (const std::string& initiator : adapter.initiators) {
+            output << "    initiator " << printable(initiator) << '\n';
+            for (const auto& [target, luns] : targetsOfPort[{i, initiator}]) {
+                output << "      target " << printable(target.second) << " of " << printable(target.first)
+                       << "  " << counted(luns, "LUN") << '\n';
+            }
+        }
+    }
+}
+
+void writeIscsi(std::ostream& output, const Model& model, const Style& style) {
+    writeTreeHeading(output, style, "iSCSI", counted(model.iscsi.paths.size(), "path"), model.iscsi.state);
+    const IscsiPath* last = nullptr;
+    Columns columns;
+    const auto flush = [&] {
+        columns.write(output, "      ");
+        columns = {};
+    };
+    for (const IscsiPath& path : model.iscsi.paths) {
+        const bool newPort = last == nullptr || last->initiatorIqn != path.initiatorIqn ||
+                             last->initiatorPort != path.initiatorPort;
+        const bool newTarget =
+            newPort || last->targetIqn != path.targetIqn || last->targetAddress != path.targetAddress;
+        if (newTarget) {
+            flush();
+        }
+        if (newPort) {
+            output << "  initiator " << printable(path.initiatorIqn) << "  " << printable(path.initiatorPort)
+                   << '\n';
+        }
+        if (newTarget) {
+            output << "    target " << printable(path.targetIqn) << "  " << printable(path.targetAddress)
+                   << '\n';
+        }
+        columns.add({printable(path.device), "LUN " + std::to_string(path.lun),
+                     path.identifier.kind == IdentifierKind::None ? "no identifier"
+                                                                  : printable(path.identifier.text)});
+        last = &path;
+    }
+    flush();
+}
+
+void writeDevices(std::ostream& output, const Model& model, const Style& style) {
+    writeTreeHeading(output, style, "Direct disks", std::to_string(model.direct.devices.size()),
+                     model.direct.state);
+    Columns columns;
+    for (const DirectDevice& direct : model.direct.devices) {
+        columns.add({printable(direct.device), direct.identifier.kind == IdentifierKind::HostName
+                                                   ? "no identifier of its own"
+                                                   : printable(direct.identifier.text)});
+    }
+    columns.write(output, "  ");
+
+    writeTreeHeading(output, style, "Logical devices", std::to_string(model.logical.devices.size()),
+                     model.logical.state);
+    for (const std::string& device : model.logical.devices) {
+        output << "  " << printable(device) << '\n';
+    }
+}
+
+void writeMultipath(std::ostream& output, const Model& model, const Style& style) {
+    writeHeading(output, style, "PowerPath (" + std::string(name(model.multipath.state)) + ")");
+    Columns columns;
+    for (const PseudoDevice& device : model.multipath.devices) {
+        columns.add({printable(device.name), printable(device.ulid)});
+    }
+    columns.write(output, "  ");
+}
+
+} // namespace
+
+std::vector<std::string> logWarnings(const LogFacts& log) {
+    std::vector<std::string> warnings;
+    if (log.runs > 1) {
+        warnings.push_back("it holds " + counted(log.runs, "run") + "; the last one is shown");
+    }
+    if (log.beginsInside) {
+        warnings.emplace_back("its beginning is missing");
+    }
+    if (log.leftoverTexts > 0) {
+        warnings.push_back(
+            counted(log.leftoverTexts, "text") +
+            " before the first run or behind the end of the last one left out: an older run's");
+    }
+    if (log.cutInLine) {
+        warnings.emplace_back("its last line has no end");
+    }
+    if (log.unknownPieces > 0) {
+        std::ostringstream warning;
+        warning << counted(log.unknownPieces, "piece") << (log.unknownPieces == 1 ? " is" : " are")
+                << " none of Morvane's texts:";
+        for (const UnknownPiece& piece : log.unknownSamples) {
+            warning << "\n    line " << piece.line << ": " << printable(piece.bytes);
+        }
+        if (log.unknownPieces > log.unknownSamples.size()) {
+            warning << "\n    and " << log.unknownPieces - log.unknownSamples.size() << " more";
+        }
+        warnings.push_back(warning.str());
+    }
+    return warnings;
+}
+
+void writeText(std::ostream& output, const Model& model, const Style& style) {
+    writeTitle(output, model, style);
+    writeProblems(output, model, style);
+    writeWarnings(output, model.log, style);
+    writeLuns(output, model, style);
+    writeFc(output, model, style);
+    writeIscsi(output, model, style);
+    writeDevices(output, model, style);
+    writeMultipath(output, model, style);
+}
+
+} // namespace view

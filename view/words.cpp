@@ -1,0 +1,83 @@
+#include "view/words.hpp"
+
+#include <array>
+
+namespace view {
+
+namespace {
+
+template <std::size_t Count, typename Enumeration>
+std::string_view pick(const std::array<std::string_view, Count>& names, Enumeration value) {
+    return names.at(static_cast<std::size_t>(value));
+}
+
+} // namespace
+
+std::string_view name(Tree tree) {
+    static constexpr std::array<std::string_view, 6> names = {"run",   "multipath", "fc",
+                                                              "iscsi", "direct",    "logical"};
+    return pick(names, tree);
+}
+
+std::string_view name(TreeState state) {
+    static constexpr std::array<std::string_view, 4> names = {"absent", "cut", "built", "ended"};
+    return pick(names, state);
+}
+
+std::string_view name(AdapterState state) {
+    static constexpr std::array<std::string_view, 4> names = {"cut", "reported", "unsupported", "failed"};
+    return pick(names, state);
+}
+
+std::string_view name(PowerPathState state) {
+    static constexpr std::array<std::string_view, 3> names = {"unknown", "not running", "running"};
+    return pick(names, state);
+}
+
+std::string_view name(Severity severity) {
+    static constexpr std::array<std::string_view, 2> names = {"problem", "note"};
+    return pick(names, severity);
+}
+
+std::string_view name(ProblemKind kind) {
+    static constexpr std::array<std::string_view, 19> names = {
+        "log-cut",
+        "assertion-failed",
+        "tree-ended",
+        "no-adapters",
+        "adapter-failed",
+        "adapter-unsupported",
+        "mapping-failed",
+        "lun-unnamed",
+        "lun-dropped",
+        "lun-left-out",
+        "inquiry-failed",
+        "not-under-powerpath",
+        "powerpath-uncertain",
+        "iscsi-not-configured",
+        "device-ignored",
+        "session-without-disks",
+        "device-unsupported",
+        "entry-ignored",
+        "identifier-not-unique",
+    };
+    return pick(names, kind);
+}
+
+std::string_view name(IdentifierKind kind) {
+    static constexpr std::array<std::string_view, 9> names = {
+        "unknown", "naa", "t10", "eui-64", "scsi-name", "md5", "standard-inquiry", "host-name", "none"};
+    return pick(names, kind);
+}
+
+std::string_view section(Tree tree) {
+    static constexpr std::array<std::string_view, 6> names = {"run",   "multipath", "FC",
+                                                              "ISCSI", "DAS",       "LOGICAL"};
+    return pick(names, tree);
+}
+
+std::string counted(std::size_t count, std::string_view one) {
+    return std::to_string(count) + " " + std::string(one) + (count == 1 ? "" : "s");
+}
+
+} // namespace view

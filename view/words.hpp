@@ -1,0 +1,26 @@
+#pragma once
+
+#include "view/model.hpp"
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+
+namespace view {
+
+// The names that JSON documents use.
+std::string_view name(Tree tree);
+std::string_view name(TreeState state);
+std::string_view name(AdapterState state);
+std::string_view name(PowerPathState state);
+std::string_view name(Severity severity);
+std::string_view name(ProblemKind kind);
+std::string_view name(IdentifierKind kind);
+
+// The section of the log that reports a tree, as the log's banners call it.
+std::string_view section(Tree tree);
+
+// "1 path", "2 paths".
+std::string counted(std::size_t count, std::string_view one);
+
+} // namespace view
