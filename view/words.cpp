@@ -76,7 +76,7 @@ std::string_view section(Tree tree) {
     return pick(names, tree);
 }
 
-std::string counted(std::size_t count, std::string_view one) {
+std::string counted(std::uint64_t count, std::string_view one) {
     return std::to_string(count) + " " + std::string(one) + (count == 1 ? "" : "s");
 }
 

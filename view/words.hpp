@@ -2,7 +2,7 @@
 
 #include "view/model.hpp"
 
-#include <cstddef>
+#include <cstdint>
 #include <string>
 #include <string_view>
 
@@ -21,6 +21,6 @@ std::string_view name(IdentifierKind kind);
 std::string_view section(Tree tree);
 
 // "1 path", "2 paths".
-std::string counted(std::size_t count, std::string_view one);
+std::string counted(std::uint64_t count, std::string_view one);
 
 } // namespace view
