@@ -4,9 +4,12 @@
 #include "view/words.hpp"
 
 #include <algorithm>
+#include <iterator>
 #include <map>
+#include <set>
 #include <string_view>
 #include <unordered_map>
+#include <unordered_set>
 #include <utility>
 
 namespace view {
@@ -133,17 +136,28 @@ void compareCounts(Difference& difference, const Model& before, const Model& aft
 template <typename Shown>
 using ByKey = std::multimap<std::string, Shown>;
 
+// Devices of one key are alike: those that kept their names are the same, of the others as many as `what` has
+// beside them got another name.
 template <typename Shown>
 void subtract(const ByKey<Shown>& from, const ByKey<Shown>& what, std::vector<Shown>& rest) {
     for (auto key = from.begin(); key != from.end();) {
+        std::multiset<std::string_view> names;
+        const auto [first, last] = what.equal_range(key->first);
+        for (auto device = first; device != last; ++device) {
+            names.insert(device->second.device);
+        }
+        std::vector<const Shown*> renamed;
         const auto end = from.upper_bound(key->first);
-        std::size_t common = what.count(key->first);
         for (; key != end; ++key) {
-            if (common > 0) {
-                --common;
+            const auto same = names.find(key->second.device);
+            if (same == names.end()) {
+                renamed.push_back(&key->second);
             } else {
-                rest.push_back(key->second);
+                names.erase(same);
             }
+        }
+        for (std::size_t i = names.size(); i < renamed.size(); ++i) {
+            rest.push_back(*renamed[i]);
         }
     }
 }
@@ -177,22 +191,62 @@ std::pair<std::string, std::string> splitPartition(const std::string& device) {
     return {disk, number};
 }
 
-ByKey<std::string> logicalByKey(const Model& model) {
+// A logical device, and whether its log tells the LUN below it.
+struct LogicalDevice {
+    std::string device;
+    bool isPlaced = false;
+};
+
+ByKey<LogicalDevice> logicalByKey(const Model& model) {
     std::unordered_map<std::string_view, std::string_view> identifierOfDisk;
     for (const Lun& lun : model.luns) {
         for (const std::string& device : lun.devices) {
             identifierOfDisk[device] = lun.identifier.text;
         }
     }
-    ByKey<std::string> devices;
+    ByKey<LogicalDevice> devices;
     for (const std::string& device : model.logical.devices) {
         const auto [disk, number] = splitPartition(device);
         const auto known = identifierOfDisk.find(disk);
-        devices.emplace(known == identifierOfDisk.end() ? device
-                                                        : "id\n" + std::string(known->second) + '\n' + number,
-                        device);
+        if (known == identifierOfDisk.end()) {
+            devices.emplace(device, LogicalDevice{device, false});
+        } else {
+            devices.emplace("id\n" + std::string(known->second) + '\n' + number, LogicalDevice{device, true});
+        }
     }
     return devices;
+}
+
+// Takes away from both lists the devices of one name of which a log does not tell the LUN: nothing says that
+// they are not the same.
+void cancelUnplaced(std::vector<LogicalDevice>& before, std::vector<LogicalDevice>& after) {
+    std::unordered_map<std::string, bool> isPlacedBefore;
+    for (const LogicalDevice& logical : before) {
+        isPlacedBefore[logical.device] = logical.isPlaced;
+    }
+    std::unordered_set<std::string> same;
+    std::erase_if(after, [&](const LogicalDevice& logical) {
+        const auto old = isPlacedBefore.find(logical.device);
+        const bool isSame = old != isPlacedBefore.end() && !(old->second && logical.isPlaced);
+        if (isSame) {
+            same.insert(logical.device);
+        }
+        return isSame;
+    });
+    std::erase_if(before, [&](const LogicalDevice& logical) { return same.contains(logical.device); });
+}
+
+void compareLogical(Difference& difference, const Model& before, const Model& after) {
+    const ByKey<LogicalDevice> old = logicalByKey(before);
+    const ByKey<LogicalDevice> now = logicalByKey(after);
+    std::vector<LogicalDevice> lost;
+    std::vector<LogicalDevice> added;
+    subtract(old, now, lost);
+    subtract(now, old, added);
+    cancelUnplaced(lost, added);
+    const auto device = [](const LogicalDevice& logical) { return logical.device; };
+    std::transform(lost.begin(), lost.end(), std::back_inserter(difference.lostLogical), device);
+    std::transform(added.begin(), added.end(), std::back_inserter(difference.newLogical), device);
 }
 
 void addWarnings(Difference& difference, const Model& model, std::string_view which) {
@@ -312,10 +366,7 @@ Difference compare(const Model& before, const Model& after) {
     const ByKey<DeviceDifference> directAfter = directByKey(after);
     subtract(directBefore, directAfter, difference.lostDirect);
     subtract(directAfter, directBefore, difference.newDirect);
-    const ByKey<std::string> logicalBefore = logicalByKey(before);
-    const ByKey<std::string> logicalAfter = logicalByKey(after);
-    subtract(logicalBefore, logicalAfter, difference.lostLogical);
-    subtract(logicalAfter, logicalBefore, difference.newLogical);
+    compareLogical(difference, before, after);
     if (before.multipath.state != after.multipath.state &&
         before.multipath.state != PowerPathState::Unknown &&
         after.multipath.state != PowerPathState::Unknown) {

@@ -53,6 +53,8 @@ public:
                                     ? "an empty identifier is none"
                                     : "blanks or zeros are no identifier; a device that refuses page "
                                       "0x83 is given them";
+            } else if (lun.identifier.kind == IdentifierKind::StandardInquiry && identifier.ends_with(':')) {
+                lun.notUnique = "vendor, product and revision alone: every device of the model may carry it";
             } else if (shared_.contains(identifier)) {
                 lun.notUnique = "several LUN numbers of one target carry it";
             }

@@ -8,6 +8,9 @@ namespace view {
 
 namespace {
 
+// A longer cell pushes the rest of its line on instead of every other line's.
+constexpr std::size_t widestColumn = 64;
+
 // The number of characters in well-formed UTF-8.
 std::size_t width(std::string_view text) {
     return static_cast<std::size_t>(std::count_if(
@@ -32,14 +35,16 @@ void Columns::write(std::ostream& output, std::string_view indent) const {
     for (const std::vector<std::string>& cells : lines_) {
         widths.resize(std::max(widths.size(), cells.size()));
         for (std::size_t i = 0; i < cells.size(); ++i) {
-            widths[i] = std::max(widths[i], width(cells[i]));
+            const std::size_t cell = width(cells[i]);
+            widths[i] = std::max(widths[i], std::min(cell, widestColumn));
         }
     }
     for (const std::vector<std::string>& cells : lines_) {
         std::string line(indent);
         for (std::size_t i = 0; i < cells.size(); ++i) {
             if (widths[i] > 0) {
-                line += cells[i] + std::string(widths[i] - width(cells[i]) + 2, ' ');
+                const std::size_t cell = width(cells[i]);
+                line += cells[i] + std::string(std::max(widths[i], cell) - cell + 2, ' ');
             }
         }
         line.resize(line.find_last_not_of(' ') + 1);

@@ -19,7 +19,8 @@ struct Style {
     static Style of(bool colour);
 };
 
-// Lines of cells, each column as wide as its widest cell. Cells are shown as they are: escape them first.
+// Lines of cells, each column as wide as its widest cell, within reason. Cells are shown as they are: escape
+// them first.
 class Columns {
 public:
     void add(std::vector<std::string> cells);

@@ -1,0 +1,108 @@
+#!/usr/bin/python3
+"""Opens the pages of morvane-view in headless Chromium. usage: page_test.py MORVANE-VIEW [unittest arguments]"""
+
+import sys
+import tempfile
+import unittest
+from pathlib import Path
+
+from selenium import webdriver
+from selenium.webdriver.chrome.service import Service
+
+import make_log
+from support import host_log, hosts, lab_log, lab_stages, report, run
+
+
+def listed(document):
+    """The targets and the LUNs that a report names: those of the trees, the host itself as the target of its direct
+    disks, an adapter as the target of the LUNs that its tree leaves out; a LUN without an identifier by its device."""
+    fc, iscsi, direct = document["fc"], document["iscsi"]["paths"], document["direct"]["devices"]
+    unlisted = [(adapter["name"], lun) for adapter in fc["adapters"] for lun in adapter["unlisted"]]
+    targets = {path["targetPort"] for path in fc["paths"]} | {name for name, _ in unlisted} | \
+        {(path["targetIqn"], path["targetAddress"]) for path in iscsi} | {"the host" for _ in direct}
+    seen = fc["paths"] + [lun for _, lun in unlisted] + iscsi + direct
+    luns = {("device", lun["device"]) if lun["identifier"] is None or lun["identifierKind"] == "host-name"
+            else ("identifier", lun["identifier"]) for lun in seen}
+    return targets, luns
+
+
+class Page(unittest.TestCase):
+    @classmethod
+    def setUpClass(cls):
+        options = webdriver.ChromeOptions()
+        for flag in ("--headless --no-sandbox --disable-gpu --disable-quic --no-first-run "
+                     "--disable-background-networking --disable-component-update --disable-sync "
+                     "--window-size=1400,1800").split():
+            options.add_argument(flag)
+        options.set_capability("goog:loggingPrefs", {"browser": "ALL"})
+        cls.browser = webdriver.Chrome(service=Service("/usr/bin/chromedriver"), options=options)
+        cls.addClassCleanup(cls.browser.quit)
+        cls.folder = tempfile.TemporaryDirectory()
+        cls.addClassCleanup(cls.folder.cleanup)
+
+    def open(self, log):
+        page = Path(self.folder.name, "page.html")
+        self.assertEqual(run("--html", page, "-", log=log).returncode, 0)
+        self.browser.get(page.as_uri())
+        self.assertEqual(self.browser.get_log("browser"), [])
+        return report(log)
+
+    def check_picture(self, document):
+        targets, luns = listed(document)
+        self.assertEqual(self.count("#picture .target"), len(targets))
+        self.assertEqual(self.count("#picture .lun[data-n]"), len(luns))
+
+    def count(self, selector):
+        return self.browser.execute_script("return document.querySelectorAll(arguments[0]).length", selector)
+
+    def test_the_picture_shows_every_target_and_lun_and_the_search_every_path(self):
+        for log in (make_log.healthy().bytes(), make_log.big(10000).bytes()):
+            document = self.open(log)
+            self.check_picture(document)
+            lun = document["luns"][0]
+            field = self.browser.find_element("id", "search")
+            field.send_keys(lun["identifier"] + "\n")
+            self.assertEqual(self.count("#paths tr.hit"), lun["pathCount"])
+            self.assertEqual(self.count("#picture .lun.hit"), 1)
+            self.assertEqual(self.count("#picture .target.hit"), lun["pathCount"])
+            self.assertEqual(self.browser.get_log("browser"), [])
+
+    def test_the_picture_of_every_simulated_host_and_run_of_the_laboratory_is_whole(self):
+        for name, log in [(host, host_log(host)) for host in hosts()] + [(stage, lab_log(stage)) for stage in lab_stages()]:
+            with self.subTest(name):
+                self.check_picture(self.open(log))
+
+    def test_the_view_of_several_hosts_draws_each_host_and_joins_their_luns(self):
+        with tempfile.TemporaryDirectory() as folder:
+            logs = [Path(folder, name) for name in ("alpha", "beta")]
+            for log in logs:
+                log.write_bytes(make_log.healthy(log.name).bytes())
+            page = Path(folder, "san.html")
+            self.assertEqual(run("san", "--html", page, *logs).returncode, 0)
+            self.browser.get(page.as_uri())
+        self.assertEqual(self.browser.get_log("browser"), [])
+        self.assertEqual((self.count("#picture .host"), self.count("#hosts tbody tr")), (2, 2))
+        targets, luns = listed(report(make_log.healthy().bytes()))
+        own = 1  # the direct disk and the way to it are each host's own
+        self.assertEqual(self.count("#picture .target"), len(targets) + own)
+        self.assertEqual(self.count("#picture .lun[data-n]"), len(luns) + own)
+
+    def test_texts_from_devices_cannot_become_markup(self):
+        log = make_log.healthy().bytes().replace(b"600A0B80000000000000000000000001", b"<img src=x></script>")
+        self.open(log)
+        self.assertEqual(self.count("img"), 0)
+        self.assertIn("<img src=x></script>", self.browser.find_element("id", "luns").text)
+
+    def test_keys_reach_the_search_and_move_in_the_picture(self):
+        self.open(make_log.healthy().bytes())
+        focused = "return document.activeElement.getAttribute('aria-label') || document.activeElement.id"
+        self.browser.find_element("tag name", "body").send_keys("/")
+        self.assertEqual(self.browser.execute_script(focused), "search")
+        self.browser.execute_script("document.querySelector('#picture [tabindex=\"0\"]').focus()")
+        self.assertEqual(self.browser.execute_script(focused), "host hosta")
+        self.browser.switch_to.active_element.send_keys("\ue014")  # arrow right
+        self.assertTrue(self.browser.execute_script(focused).startswith("initiator "))
+
+
+if __name__ == "__main__":
+    unittest.main(argv=[sys.argv[0], *sys.argv[2:]])
