@@ -1,6 +1,6 @@
-// whole_run SIMHOST MORVANE RECORDER FLOOR LAUNCH [SIZE...]: measures whole runs on simulated hosts of so
-// many LUNs, each beside its floor, and the start-up on an empty host beside /bin/true; prints both as
-// tables.
+// whole_run SIMHOST MORVANE RECORDER FLOOR LAUNCH VIEW [SIZE...]: measures whole runs on simulated hosts of
+// so many LUNs, each beside its floor, the start-up on an empty host beside /bin/true, and the reading of the
+// runs' logs by morvane-view beside a grep for one word in them; prints each as a table.
 #include <algorithm>
 #include <filesystem>
 #include <fstream>
@@ -21,6 +21,7 @@ struct Programs {
     std::string recorder;
     std::string floor;
     std::string launch;
+    std::string view;
 };
 
 struct Sample {
@@ -90,6 +91,10 @@ public:
 
     Sample nothing() { return launched({"/bin/true"}); }
 
+    // The log of the last run, read.
+    Sample view() { return launched({mPrograms.view}); }
+    Sample grep() { return launched({"/bin/grep", "-c", "Entered", "MorvaneLogs/Morvane.log"}); }
+
     [[nodiscard]] std::uintmax_t logBytes() const {
         return std::filesystem::file_size(mFolder.path() / "MorvaneLogs/Morvane.log");
     }
@@ -157,7 +162,37 @@ void measureStartUp(const Programs& programs) {
               << milliseconds(least.childSeconds) << " | " << least.peakKib << " |\n\n";
 }
 
+// What it takes to read the log of a run.
+struct Reading {
+    unsigned luns = 0;
+    std::uintmax_t logBytes = 0;
+    Sample view;
+    Sample grep;
+};
+
+Reading measureReading(Bench& bench, unsigned luns, unsigned rounds) {
+    std::vector<Sample> view;
+    std::vector<Sample> grep;
+    for (unsigned round = 0; round < rounds; ++round) {
+        view.push_back(bench.view());
+        grep.push_back(bench.grep());
+    }
+    return {luns, bench.logBytes(), best(view), best(grep)};
+}
+
+void printReadings(const std::vector<Reading>& readings) {
+    std::cout << "\n| LUNs | log MB | morvane-view ms | grep -c Entered ms | ratio | peak KiB |\n"
+                 "|---|---|---|---|---|---|\n";
+    for (const Reading& reading : readings) {
+        std::cout << "| " << reading.luns << " | " << static_cast<double>(reading.logBytes) / 1e6 << " | "
+                  << milliseconds(reading.view.ownSeconds) << " | " << milliseconds(reading.grep.ownSeconds)
+                  << " | " << reading.view.ownSeconds / reading.grep.ownSeconds << " | "
+                  << reading.view.peakKib << " |\n";
+    }
+}
+
 void measureSizes(const Programs& programs, const std::vector<unsigned>& sizes) {
+    std::vector<Reading> readings;
     std::cout
         << "| LUNs | log MB | morvane ms | in children | floor ms | ratio | morvane us/LUN | floor us/LUN "
            "| peak KiB | KiB a LUN beyond the first row |\n|---|---|---|---|---|---|---|---|---|---|\n";
@@ -184,25 +219,28 @@ void measureSizes(const Programs& programs, const std::vector<unsigned>& sizes) 
                   << " | " << own.ownSeconds / least.ownSeconds << " | " << own.ownSeconds / luns * 1e6
                   << " | " << least.ownSeconds / luns * 1e6 << " | " << own.peakKib << " | "
                   << static_cast<double>(own.peakKib - firstPeakKib) / moreLuns << " |" << std::endl;
+        readings.push_back(measureReading(bench, luns, rounds));
     }
+    printReadings(readings);
 }
 
 } // namespace
 
 int main(int argc, char** argv) {
     const std::vector<std::string> arguments(argv + 1, argv + argc);
-    if (arguments.size() < 5) {
-        std::cerr << "usage: whole_run SIMHOST MORVANE RECORDER FLOOR LAUNCH [SIZE...]\n";
+    if (arguments.size() < 6) {
+        std::cerr << "usage: whole_run SIMHOST MORVANE RECORDER FLOOR LAUNCH VIEW [SIZE...]\n";
         return 2;
     }
     std::vector<unsigned> sizes;
-    for (std::size_t i = 5; i < arguments.size(); ++i) {
+    for (std::size_t i = 6; i < arguments.size(); ++i) {
         sizes.push_back(static_cast<unsigned>(std::stoul(arguments[i])));
     }
     if (sizes.empty()) {
         sizes = {10, 100, 1000, 10000};
     }
-    const Programs programs = {arguments[0], arguments[1], arguments[2], arguments[3], arguments[4]};
+    const Programs programs = {arguments[0], arguments[1], arguments[2],
+                               arguments[3], arguments[4], arguments[5]};
     try {
         measureStartUp(programs);
         measureSizes(programs, sizes);
