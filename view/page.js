@@ -75,6 +75,9 @@
     lun.words = [...new Set(lun.words)];
   }
 
+  // A path is a device node of a host: the FC tree lists an adapter's LUNs once below each of its ports.
+  const pathCount = (list) => list.reduce((sum, lun) => sum + lun.devices.size, 0);
+
   // ---- The picture -----------------------------------------------------------------------------------------
 
   // LUNs seen over the same paths stand in one box, so that a line is drawn for a box and not for each of its
@@ -233,11 +236,13 @@
   const sections = [];
   const finder = (text, shown = text) => `<button type="button" class="find" data-find="${esc(text)}">${esc(shown)}</button>`;
 
+  const numeric = new Set(["LUN", "LUNs", "Number", "Paths", "Problems"]);
+
   function table(id, title, heads, rows) {
     sections.push([id, `${title} (${rows.length})`]);
     const body = rows.length ? rows.join("") : `<tr><td colspan="${heads.length}" class="faint">none</td></tr>`;
     return `<section id="${id}" aria-labelledby="${id}-heading"><h2 id="${id}-heading">${esc(title)} (${rows.length})</h2>` +
-      `<div class="table"><table><thead><tr>${heads.map((h) => `<th scope="col">${esc(h)}</th>`).join("")}</tr></thead><tbody>${body}</tbody></table></div></section>`;
+      `<div class="table"><table><thead><tr>${heads.map((h) => `<th scope="col"${numeric.has(h) ? ' class="number"' : ""}>${esc(h)}</th>`).join("")}</tr></thead><tbody>${body}</tbody></table></div></section>`;
   }
 
   const many = hosts.length > 1;
@@ -286,16 +291,16 @@
         return `<tr id="${lun.row}"><td class="key">${finder(lun.label)}</td><td>${esc([lun.vendor, lun.product].filter(Boolean).join(" "))}</td><td>${esc(lun.pseudoDevice)}</td><td class="number">${lun.devices.size}</td>${many ? `<td>${esc(perHost(lun))}</td>` : ""}<td>${remark}</td></tr>`;
       })));
     number = 0;
-    out.push(table("paths", "Paths", [...hostHead, "Device", "Over", "Initiator", "Target", "LUN", "Identifier"],
+    out.push(table("paths", "Listed paths", [...hostHead, "Device", "Over", "Initiator", "Target", "LUN", "Identifier"],
       paths.map((path) => {
         path.row = `p${number++}`;
-        return `<tr id="${path.row}">${hostCell(path.host)}<td class="key">${esc(path.device)}</td><td>${esc(path.kind)}</td><td class="key">${esc(path.initiator)}</td><td class="key">${esc(path.target)}</td><td class="number">${path.number ?? ""}</td><td class="key">${esc(path.lun.label)}</td></tr>`;
+        return `<tr id="${path.row}">${hostCell(path.host)}<td class="key name">${esc(path.device)}</td><td>${esc(path.kind)}</td><td class="key name">${esc(path.initiator)}</td><td class="key">${esc(path.target)}</td><td class="number">${path.number ?? ""}</td><td class="key">${esc(path.lun.label)}</td></tr>`;
       })));
     out.push(table("adapters", "Fibre Channel adapters", [...hostHead, "Number", "Name", "Model", "Node", "State"],
       hosts.flatMap((host) => host.report.fc.adapters.map((a) =>
         `<tr>${hostCell(host)}<td class="number">${a.number ?? ""}</td><td>${esc(a.name)}</td><td>${esc([a.manufacturer, a.model].filter(Boolean).join(" "))}</td><td class="key">${esc(a.node)}</td><td>${a.state === "reported" ? "reported" : `<span class="bad">${esc(a.state)}</span> ${esc(a.cause)}`}</td></tr>`))));
     out.push(table("logical", "Logical devices", [...hostHead, "Device"], hosts.flatMap((host) =>
-      host.report.logical.devices.map((device) => `<tr>${hostCell(host)}<td class="key">${esc(device)}</td></tr>`))));
+      host.report.logical.devices.map((device) => `<tr>${hostCell(host)}<td class="key name">${esc(device)}</td></tr>`))));
     out.push(table("powerpath", "PowerPath devices", [...hostHead, "Pseudo device", "Logical device"], hosts.flatMap((host) =>
       host.report.multipath.devices.map((d) => `<tr>${hostCell(host)}<td>${esc(d.pseudoDevice)}</td><td class="key">${esc(d.ulid)}</td></tr>`))));
     return out.join("");
@@ -333,13 +338,11 @@
     for (const lun of luns.values()) {
       byId(lun.row).hidden = hits !== null && !shown.has(lun);
     }
-    let count = 0;
     for (const path of paths) {
       const hit = shown.has(path.lun);
       const row = byId(path.row);
       row.hidden = hits !== null && !hit;
       if (hit) {
-        count += 1;
         mark(row);
         path.nodes.forEach((node, column) => {
           if (column < 3) {
@@ -353,7 +356,7 @@
       mark(byId(lun.row));
       mark(byId(`n${lun.node.number}`));
     }
-    byId("hits").textContent = hits === null ? "" : `${plural(hits.length, "LUN")}, ${plural(count, "path")}`;
+    byId("hits").textContent = hits === null ? "" : `${plural(hits.length, "LUN")}, ${plural(pathCount(hits), "path")}`;
     if (hits?.length) {
       const picture = byId("picture");
       picture.scrollTop = Math.max(0, hits[0].node.y - picture.clientHeight / 2);
@@ -364,7 +367,7 @@
 
   document.title = doc.title;
   byId("title").textContent = doc.title;
-  byId("summary").textContent = [plural(hosts.length, "log"), plural(luns.size, "LUN"), plural(paths.length, "path")].join(", ") +
+  byId("summary").textContent = [plural(hosts.length, "log"), plural(luns.size, "LUN"), plural(pathCount([...luns.values()]), "path")].join(", ") +
     (many ? "" : `, from ${doc.reports[0].report.log.name}`);
   byId("problems").innerHTML = problemsHtml();
   draw();

@@ -143,7 +143,7 @@ std::string adapterWords(const Adapter& adapter) {
 void writeFc(std::ostream& output, const Model& model, const Style& style) {
     const FcTree& fc = model.fc;
     writeTreeHeading(output, style, "Fibre Channel",
-                     counted(fc.adapters.size(), "adapter") + ", " + counted(fc.paths.size(), "path"),
+                     counted(fc.adapters.size(), "adapter") + ", " + counted(fc.paths.size(), "listed path"),
                      fc.state);
     using Target = std::pair<std::string, std::string>; // node and port
     using Targets = std::vector<std::pair<Target, std::size_t>>;

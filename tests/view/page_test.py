@@ -87,6 +87,14 @@ class Page(unittest.TestCase):
         self.assertEqual(self.count("#picture .target"), len(targets) + own)
         self.assertEqual(self.count("#picture .lun[data-n]"), len(luns) + own)
 
+    def test_paper_shows_the_whole_picture_and_nothing_to_type_into(self):
+        self.open(make_log.big(10000).bytes())
+        self.browser.execute_cdp_cmd("Emulation.setEmulatedMedia", {"media": "print"})
+        self.addCleanup(self.browser.execute_cdp_cmd, "Emulation.setEmulatedMedia", {"media": ""})
+        self.assertFalse(self.browser.find_element("id", "search").is_displayed())
+        picture = self.browser.find_element("id", "picture")
+        self.assertEqual(picture.get_property("scrollHeight"), picture.get_property("clientHeight"))
+
     def test_texts_from_devices_cannot_become_markup(self):
         log = make_log.healthy().bytes().replace(b"600A0B80000000000000000000000001", b"<img src=x></script>")
         self.open(log)
