@@ -2,6 +2,8 @@
 """Runs morvane-view on logs and checks what it says. usage: program_test.py MORVANE-VIEW SIMHOST MORVANE"""
 
 import json
+import os
+import pty
 import re
 import subprocess
 import sys
@@ -10,7 +12,7 @@ import unittest
 from pathlib import Path
 
 import make_log
-from support import HERE, HOSTS, host_log, hosts, report, run, valid
+from support import HERE, HOSTS, PROGRAM, host_log, hosts, report, run, valid
 
 SIMHOST, MORVANE = (Path(argument).resolve() for argument in sys.argv[2:4])
 
@@ -146,6 +148,30 @@ class San(unittest.TestCase):
                          [{"host": "alpha", "pathCount": 4}, {"host": "beta", "pathCount": 4}])
         self.assertEqual(seen["600601604B2A1E00AAAAAAAAAAAAAA01"]["hosts"], [{"host": "gamma", "pathCount": 1}])
         self.assertEqual([i for i, lun in seen.items() if lun["notUnique"]], ["0" * 32, "ACME:BOX:1.0:x"])
+
+
+class Colour(unittest.TestCase):
+    def shown_on_terminal(self, **environment):
+        """What the program writes on a terminal."""
+        ours, theirs = pty.openpty()
+        with tempfile.TemporaryDirectory() as folder, open(ours, "rb", buffering=0) as terminal:
+            log = Path(folder, "log")
+            log.write_bytes(host_log("das-naa"))
+            subprocess.run([PROGRAM, log], stdout=theirs, check=True, timeout=60,
+                           env={key: value for key, value in os.environ.items() if key != "NO_COLOR"} | environment)
+            os.close(theirs)
+            shown = b""
+            while True:
+                try:
+                    shown += terminal.read(4096)
+                except OSError:  # nothing more: the other end is closed
+                    return shown
+
+    def test_is_for_terminals_only_and_not_where_the_user_wants_none(self):
+        self.assertIn(b"\x1b[32mNo problems.\x1b[0m", self.shown_on_terminal())
+        self.assertIn(b"\x1b[", self.shown_on_terminal(NO_COLOR=""))
+        self.assertNotIn(b"\x1b", self.shown_on_terminal(NO_COLOR="1"))
+        self.assertNotIn(b"\x1b", run("-", log=host_log("das-naa")).stdout)
 
 
 class Errors(unittest.TestCase):
