@@ -1,13 +1,21 @@
-# bash completion for morvane-view
+# bash completion for morvane-view: options and subcommands. File names are bash's own part (-f), as it knows how to
+# quote them.
 _morvane_view() {
-    local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]} command=""
-    [[ ${COMP_WORDS[1]} == diff || ${COMP_WORDS[1]} == san ]] && command=${COMP_WORDS[1]}
-    local words="--json --html --help --version"
-    [[ $command == diff ]] && words="--json --help"
-    [[ $command == san ]] && words="--json --html --help"
-    [[ $COMP_CWORD -eq 1 ]] && words="diff san $words"
-    [[ $previous == --html ]] && words=""
-    compopt -o filenames 2>/dev/null
-    mapfile -t COMPREPLY < <(compgen -W "$words" -- "$current"; compgen -f -- "$current")
+    local current=${COMP_WORDS[COMP_CWORD]} words=() word
+    COMPREPLY=()
+    case ${COMP_WORDS[COMP_CWORD - 1]} in --html | =) return ;; esac # --html FILE and --html=FILE: files alone
+    if [[ $current == -* ]]; then
+        case ${COMP_WORDS[1]} in
+            diff) words=(--json --help) ;;
+            san) words=(--json --html --help) ;;
+            *) words=(--json --html --help --version) ;;
+        esac
+    elif [[ $COMP_CWORD -eq 1 ]]; then
+        words=(diff san)
+    fi
+    for word in "${words[@]}"; do
+        [[ $word == "$current"* ]] && COMPREPLY+=("$word")
+    done
+    return 0
 }
-complete -F _morvane_view morvane-view
+complete -f -o filenames -o bashdefault -F _morvane_view morvane-view
