@@ -1,39 +1,48 @@
-# What `cmake --install` puts where, and the Debian package of it. ./dev package makes the packages: it knows
-# what they depend on.
+# What `cmake --install` puts where, and the Debian packages of it: one for each program, a component of its name.
+# ./dev package makes the packages: it knows what they depend on.
 include(GNUInstallDirs)
-set(CMAKE_SKIP_INSTALL_ALL_DEPENDENCY ON) # installing needs the program, not the tests
+set(CMAKE_SKIP_INSTALL_ALL_DEPENDENCY ON) # installing needs the programs, not the tests
 
-# Debian wants manual pages and changelogs compressed, and without a name and a time, to be reproducible.
-function(morvane_gzip SOURCE OUTPUT)
-  add_custom_command(OUTPUT ${OUTPUT}
-    COMMAND gzip -9nc ${CMAKE_SOURCE_DIR}/${SOURCE} > ${OUTPUT}
+# Debian wants manual pages and changelogs compressed, and without a name and a time, to be reproducible. The result
+# stands in the build folder.
+add_custom_target(compressed_documents ALL)
+function(morvane_gzip SOURCE)
+  cmake_path(GET SOURCE FILENAME name)
+  set(output ${CMAKE_BINARY_DIR}/${name}.gz)
+  add_custom_command(OUTPUT ${output}
+    COMMAND gzip -9nc ${CMAKE_SOURCE_DIR}/${SOURCE} > ${output}
     DEPENDS ${CMAKE_SOURCE_DIR}/${SOURCE} VERBATIM)
+  target_sources(compressed_documents PRIVATE ${output})
 endfunction()
-morvane_gzip(docs/morvane.8 ${CMAKE_BINARY_DIR}/morvane.8.gz)
-morvane_gzip(packaging/changelog ${CMAKE_BINARY_DIR}/changelog.gz)
-add_custom_target(compressed_documents ALL DEPENDS ${CMAKE_BINARY_DIR}/morvane.8.gz ${CMAKE_BINARY_DIR}/changelog.gz)
+morvane_gzip(packaging/changelog)
 
-install(TARGETS morvane RUNTIME DESTINATION ${CMAKE_INSTALL_SBINDIR} COMPONENT morvane)
-# Stripping also takes the compilers' names, as Debian's packages do it.
-install(CODE "if(CMAKE_INSTALL_DO_STRIP)
-  execute_process(COMMAND ${CMAKE_STRIP} --remove-section=.comment
-    \$ENV{DESTDIR}\${CMAKE_INSTALL_PREFIX}/${CMAKE_INSTALL_SBINDIR}/morvane COMMAND_ERROR_IS_FATAL ANY)
-endif()" COMPONENT morvane)
-install(FILES ${CMAKE_BINARY_DIR}/morvane.8.gz DESTINATION ${CMAKE_INSTALL_MANDIR}/man8 COMPONENT morvane)
-install(FILES README.md packaging/copyright ${CMAKE_BINARY_DIR}/changelog.gz
-  DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT morvane)
-file(GLOB documents CONFIGURE_DEPENDS docs/*.md docs/*.svg)
-install(FILES ${documents} DESTINATION ${CMAKE_INSTALL_DOCDIR}/docs COMPONENT morvane)
-install(FILES packaging/lintian-overrides
-  DESTINATION ${CMAKE_INSTALL_DATADIR}/lintian/overrides RENAME morvane COMPONENT morvane)
+# Installs a program with what every package holds: its manual page, the copyright, the changelog and what lintian is
+# to overlook.
+function(morvane_install PROGRAM FOLDER MANUAL)
+  install(TARGETS ${PROGRAM} RUNTIME DESTINATION ${FOLDER} COMPONENT ${PROGRAM})
+  # Stripping also takes the compilers' names, as Debian's packages do it.
+  install(CODE "if(CMAKE_INSTALL_DO_STRIP)
+    execute_process(COMMAND ${CMAKE_STRIP} --remove-section=.comment
+      \$ENV{DESTDIR}\${CMAKE_INSTALL_PREFIX}/${FOLDER}/${PROGRAM} COMMAND_ERROR_IS_FATAL ANY)
+  endif()" COMPONENT ${PROGRAM})
+  morvane_gzip(${MANUAL})
+  cmake_path(GET MANUAL FILENAME page)
+  string(REGEX MATCH "[1-8]$" section ${page})
+  install(FILES ${CMAKE_BINARY_DIR}/${page}.gz
+    DESTINATION ${CMAKE_INSTALL_MANDIR}/man${section} COMPONENT ${PROGRAM})
+  install(FILES packaging/copyright ${CMAKE_BINARY_DIR}/changelog.gz
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/${PROGRAM} COMPONENT ${PROGRAM})
+  install(FILES packaging/${PROGRAM}.lintian-overrides
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/lintian/overrides RENAME ${PROGRAM} COMPONENT ${PROGRAM})
+endfunction()
 
 set(CPACK_GENERATOR DEB)
 set(CPACK_PACKAGE_CONTACT "Morvane maintainers <morvane@example.org>")
+set(CPACK_PACKAGE_DESCRIPTION_SUMMARY "") # each package's description begins with its own
 set(CPACK_STRIP_FILES ON)
 set(CPACK_INSTALL_DEFAULT_DIRECTORY_PERMISSIONS
   OWNER_READ OWNER_WRITE OWNER_EXECUTE GROUP_READ GROUP_EXECUTE WORLD_READ WORLD_EXECUTE)
 set(CPACK_DEB_COMPONENT_INSTALL ON)
-set(CPACK_COMPONENTS_ALL morvane)
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 if(CMAKE_SIZEOF_VOID_P EQUAL 4)
   set(CPACK_DEBIAN_PACKAGE_ARCHITECTURE i386)
@@ -41,15 +50,48 @@ else()
   set(CPACK_DEBIAN_PACKAGE_ARCHITECTURE amd64)
 endif()
 set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
+
+morvane_install(morvane ${CMAKE_INSTALL_SBINDIR} docs/morvane.8)
+install(FILES README.md DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane COMPONENT morvane)
+file(GLOB documents CONFIGURE_DEPENDS docs/*.md docs/*.svg)
+list(REMOVE_ITEM documents ${CMAKE_SOURCE_DIR}/docs/fleet.md) # morvane-view's
+install(FILES ${documents} DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane/docs COMPONENT morvane)
+
+set(CPACK_COMPONENTS_ALL morvane)
 set(CPACK_DEBIAN_MORVANE_PACKAGE_NAME morvane)
 set(CPACK_DEBIAN_MORVANE_PACKAGE_SECTION admin)
 set(CPACK_DEBIAN_MORVANE_PACKAGE_RECOMMENDS procps) # pgrep, for the look at PowerPath's daemon
-set(CPACK_DEBIAN_MORVANE_PACKAGE_SUGGESTS open-iscsi)
+set(CPACK_DEBIAN_MORVANE_PACKAGE_SUGGESTS "morvane-view, open-iscsi")
 set(CPACK_COMPONENT_MORVANE_DESCRIPTION
-"Morvane finds every storage path of a Linux host: Fibre Channel LUNs through
+"Storage-path report for Linux hosts
+Morvane finds every storage path of a Linux host: Fibre Channel LUNs through
 the SNIA HBA API, iSCSI sessions, direct disks and logical devices. It reads
 each LUN's identity from the device itself with SCSI INQUIRY and writes one
 log: the report, and a trace of every step that led to it.
 .
 It takes no arguments and changes nothing on the host but its log directory.")
+
+if(TARGET morvane-view)
+  morvane_install(morvane-view ${CMAKE_INSTALL_BINDIR} view/morvane-view.1)
+  install(FILES view/morvane-view.bash DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
+    RENAME morvane-view COMPONENT morvane-view)
+  install(FILES view/morvane-log.schema.json DESTINATION ${CMAKE_INSTALL_DATADIR}/morvane-view COMPONENT morvane-view)
+  install(FILES docs/fleet.md docs/view.png
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane-view COMPONENT morvane-view)
+
+  list(APPEND CPACK_COMPONENTS_ALL morvane-view)
+  set(CPACK_DEBIAN_MORVANE-VIEW_PACKAGE_NAME morvane-view)
+  set(CPACK_DEBIAN_MORVANE-VIEW_PACKAGE_SOURCE morvane)
+  set(CPACK_DEBIAN_MORVANE-VIEW_PACKAGE_SECTION utils)
+  set(CPACK_DEBIAN_MORVANE-VIEW_PACKAGE_SUGGESTS jq) # for the questions in the manual page
+  set(CPACK_COMPONENT_MORVANE-VIEW_DESCRIPTION
+"Reader of Morvane's storage-path logs
+morvane-view shows what a log of Morvane says: what is wrong first, each with
+its cause, then every LUN with its paths, then the trees; as text, as JSON, or
+as a page for the browser with a picture of the topology and a search. It tells
+what differs between two logs of a host, and joins the logs of many hosts into
+one view of the SAN.
+.
+It needs no storage, no root and no Morvane on the machine that reads.")
+endif()
 include(CPack)
