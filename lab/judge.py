@@ -1,13 +1,15 @@
 #!/usr/bin/env python3
 """Compares what Morvane reported in the laboratory with what the trusted tools said there.
 
-usage: lab/judge.py build/lab/ARCH/out
+usage: lab/judge.py build/lab/ARCH/out MORVANE-VIEW
 
 Device names change from boot to boot, but within one stage of one boot a name means the same disk to Morvane and to the
 tools; that is the only place where names are compared. Exit status 1 if anything differs.
 """
 
+import json
 import re
+import subprocess
 import sys
 from collections import Counter, defaultdict
 from pathlib import Path
@@ -305,7 +307,35 @@ def judge_fault(sheet: Sheet, stage: Stage) -> list[str]:
     return [f"  {stage.name:<24}{stage.seconds:6.1f} s  {lines[0]}", *(f"{'':36}{line}" for line in lines[1:])]
 
 
-# ---- scale and word sizes
+# ---- morvane-view, scale and word sizes
+
+
+def judge_view(sheet: Sheet, place: Path, view: str) -> None:
+    """morvane-view, which shares no code with this judge, reads every stage's log as the judge does."""
+    sheet.title("morvane-view")
+    for log in sorted(place.glob("*/Morvane.log")):
+        read = subprocess.run([view, "--json", log], capture_output=True)
+        if read.returncode != 0:
+            sheet.row(f"{log.parent.name}: reads the log", False, read.stderr.decode(errors="replace").strip())
+            continue
+        document = json.loads(read.stdout)
+        report = Stage(log.parent).report
+        fc = {(path["initiator"], path["targetPort"], path["device"], path["lun"], path["identifier"])
+              for path in document["fc"]["paths"]}
+        iscsi = {(path["initiatorPort"], path["targetIqn"], path["targetAddress"], path["device"], path["lun"])
+                 for path in document["iscsi"]["paths"]}
+        same = (
+            fc == {(path.initiator_wwpn, path.target_wwpn, path.device, path.lun, path.identifier) for path in report.fc_paths}
+            and iscsi == {(path.initiator_port, path.target, path.target_port, path.device, path.lun)
+                          for path in report.iscsi_paths}
+            and [(disk["device"], disk["identifier"]) for disk in document["direct"]["devices"]] == report.das
+            and document["logical"]["devices"] == [device for device, _ in report.logical]
+        )
+        unknown = document["log"]["unknown"]
+        sheet.row(f"{log.parent.name}: the same paths and devices, no text unknown, the log whole",
+                  same and unknown["count"] == 0 and document["log"]["complete"],
+                  f"{len(fc)} FC, {len(iscsi)} iSCSI, {len(report.das)} direct, {document['log']['texts']} texts"
+                  + "".join(f"; unknown: {sample['text']}" for sample in unknown["samples"]))
 
 
 def judge_scale(sheet: Sheet, place: Path) -> None:
@@ -380,6 +410,7 @@ def main() -> int:
         print("\n".join(table))
     if (place / "scale").exists():
         judge_scale(sheet, place / "scale")
+    judge_view(sheet, place, sys.argv[2])
     judge_word_sizes(sheet, arch, healthy, place)
     print(f"\nlab {arch}: {sheet.rows} compared, {sheet.mismatches} mismatches")
     return 1 if sheet.mismatches else 0

@@ -129,9 +129,10 @@ void writeText(std::ostream& output, const San& san, const Style& style) {
     Columns hosts;
     for (std::size_t i = 0; i < san.hosts.size(); ++i) {
         const Model& report = (*san.reports)[i];
+        const bool isNamedByLog = san.hosts[i].find(report.log.name) != std::string::npos;
         hosts.add({printable(san.hosts[i]), counted(report.luns.size(), "LUN"),
                    counted(problemCount(report), "problem"), report.log.complete ? "" : "the log is cut off",
-                   printable(report.log.name)});
+                   isNamedByLog ? "" : printable(report.log.name)});
     }
     hosts.write(output, "  ");
 
