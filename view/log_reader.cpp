@@ -4,7 +4,6 @@
 
 #include <algorithm>
 #include <array>
-#include <cstring>
 #include <utility>
 #include <vector>
 
@@ -13,8 +12,8 @@ namespace view {
 namespace {
 
 // A text is followed over at most this many lines and bytes before its first line counts as unknown.
-constexpr std::size_t maximumHeldLines = 32;
-constexpr std::size_t maximumHeldBytes = 64UL * 1024;
+constexpr std::ptrdiff_t maximumHeldLines = 32;
+constexpr std::size_t maximumHeldBytes = 16UL * 1024;
 
 // A line is the table of PowerPath's devices at its longest; of a longer one the rest is taken as a line
 // anew.
@@ -25,18 +24,29 @@ constexpr std::size_t sampleLength = 120;
 
 constexpr std::array<std::string_view, 2> traceBeginnings = {"Entered Function ", "Left Function "};
 
-// The next place after the first byte where a trace line may begin.
-std::size_t findTrace(std::string_view bytes) {
-    std::size_t first = std::string_view::npos;
-    for (const std::string_view beginning : traceBeginnings) {
-        first = std::min(first, bytes.find(beginning, 1));
-    }
-    return first;
-}
-
 bool isTrace(std::string_view line) {
     return std::any_of(traceBeginnings.begin(), traceBeginnings.end(),
                        [line](std::string_view beginning) { return line.starts_with(beginning); });
+}
+
+// Where, behind its first byte, the last trace line on `line` may begin; the end of `line` if nowhere. A
+// trace line goes on to the end of its line, so no other one matters.
+std::size_t findTrace(std::string_view line) {
+    std::size_t last = 0;
+    for (const std::string_view beginning : traceBeginnings) {
+        const std::size_t found = line.rfind(beginning);
+        last = std::max(last, found == std::string_view::npos ? 0 : found);
+    }
+    return last == 0 ? line.size() : last;
+}
+
+std::ptrdiff_t lineEndsIn(std::string_view bytes) {
+    return std::count(bytes.begin(), bytes.end(), '\n');
+}
+
+// Whether a text that begins `bytes` may still go on behind them.
+bool mayGoOn(std::string_view bytes) {
+    return bytes.size() <= maximumHeldBytes && lineEndsIn(bytes) < maximumHeldLines;
 }
 
 } // namespace
@@ -48,137 +58,110 @@ LogReader::LogReader(std::string name) : matcher_(knownTexts()) {
 void LogReader::feed(std::string_view bytes) {
     facts_.bytes += bytes.size();
     while (!bytes.empty()) {
-        const std::size_t end = bytes.find('\n');
-        if (end == std::string_view::npos) {
-            partialLine_ += bytes;
-            if (partialLine_.size() >= maximumLine) {
-                takeLine(std::exchange(partialLine_, {}));
-            }
-            return;
-        }
-        if (partialLine_.empty()) {
-            takeLine(bytes.substr(0, end));
+        const std::string_view front = bytes.substr(0, maximumLine - partialLine_.size());
+        const std::size_t end = front.find('\n');
+        const std::string_view part = front.substr(0, end == std::string_view::npos ? end : end + 1);
+        bytes.remove_prefix(part.size());
+        if (end == std::string_view::npos && partialLine_.size() + part.size() < maximumLine) {
+            partialLine_ += part;
+        } else if (partialLine_.empty()) {
+            takeLine(part);
         } else {
-            partialLine_ += bytes.substr(0, end);
+            partialLine_ += part;
             takeLine(std::exchange(partialLine_, {}));
         }
-        bytes.remove_prefix(end + 1);
     }
 }
 
 Model LogReader::finish() {
     if (!partialLine_.empty()) {
-        facts_.cutInLine = true;
         takeLine(std::exchange(partialLine_, {}));
     }
-    drain(true);
+    takeTexts(held_, false);
+    facts_.cutInLine = isInLine_;
+    facts_.lines = line_ - (isInLine_ ? 0 : 1);
     Model model = builder_.finish(std::move(facts_));
     groupLuns(model);
     return model;
 }
 
+// Takes a line with its line end, or holds it.
 void LogReader::takeLine(std::string_view line) {
-    ++facts_.lines;
+    if (isTrace(line)) { // the rest of a held text never comes
+        takeTexts(std::exchange(held_, {}), false);
+    }
     if (held_.empty()) {
-        lineNumber_ = facts_.lines;
-        if (takeTexts(line, true) == Outcome::Taken) {
-            return;
-        }
-    }
-    held_.emplace_back(line);
-    drain(false);
-}
-
-// Takes the held lines: the first alone, or with as many of the next as its text runs over.
-void LogReader::drain(bool atEnd) {
-    while (!held_.empty()) {
-        lineNumber_ = facts_.lines - held_.size() + 1;
-        std::string joined = held_.front();
-        std::size_t used = 1;
-        bool mayWait = true;
-        while (takeTexts(joined, mayWait) == Outcome::NeedsMore) {
-            const bool isOver = used == maximumHeldLines || joined.size() > maximumHeldBytes;
-            const bool isLast = used == held_.size();
-            if (isLast && !isOver && !atEnd) {
-                return;
-            }
-            if (isLast || isOver || isTrace(held_[used])) { // the rest of the text never comes
-                joined = held_.front();
-                used = 1;
-                mayWait = false;
-                continue;
-            }
-            joined += '\n';
-            joined += held_[used];
-            ++used;
-        }
-        held_.erase(held_.begin(), held_.begin() + static_cast<std::ptrdiff_t>(used));
+        held_ = line.substr(takeTexts(line, true));
+    } else {
+        held_ += line;
+        held_.erase(0, takeTexts(held_, true));
     }
 }
 
-// Cuts a line into its texts and hands them on. With `mayWait`, hands on nothing and returns NeedsMore when
-// the last text of the line may go on in the next one.
-LogReader::Outcome LogReader::takeTexts(std::string_view bytes, bool mayWait) {
-    struct Piece {
-        bool isKnown = false;
-        TextMatch match;
-        std::string_view unknown;
-    };
-    const bool isOneLine = bytes.find('\n') == std::string_view::npos;
-    // Almost every line is one text; only a line of several needs the list.
-    std::vector<Piece> pieces;
-    std::string_view rest = bytes;
-    while (!rest.empty()) {
-        Piece piece;
-        const MatchResult result = matcher_.match(rest, piece.match);
-        if (result == MatchResult::Found && piece.match.length > 0) {
-            if (piece.match.length == rest.size() && pieces.empty()) {
-                ++facts_.knownTexts;
-                inOpenText_ = piece.match.text == Text::OpenEnded;
-                builder_.take(piece.match, lineNumber_);
-                return Outcome::Taken;
+// Cuts `bytes`, which end with a line, into texts and hands them on. With `mayWait`, stops before a text that
+// may go on behind them. Returns the number of bytes taken.
+std::size_t LogReader::takeTexts(std::string_view bytes, bool mayWait) {
+    std::size_t at = 0;
+    while (at < bytes.size()) {
+        std::size_t lineEnd = std::min(bytes.find('\n', at), bytes.size());
+        while (at < lineEnd) {
+            const std::string_view line = bytes.substr(at, lineEnd - at);
+            TextMatch match;
+            MatchResult result = matcher_.match(line, match);
+            if (result == MatchResult::Unending && (isInLine_ || !inOpenText_)) {
+                const std::string_view lines = bytes.substr(at);
+                if (mayWait && mayGoOn(lines)) {
+                    return at;
+                }
+                result = matcher_.match(lines, match);
             }
-            piece.isKnown = true;
-            rest.remove_prefix(piece.match.length);
-        } else {
-            if (mayWait && result == MatchResult::Unending && !(inOpenText_ && pieces.empty())) {
-                return Outcome::NeedsMore;
-            }
-            std::size_t end = findTrace(rest);
-            if (!isOneLine) {
-                end = std::min(end, rest.find('\n'));
-            }
-            piece.unknown = rest.substr(0, end);
-            rest.remove_prefix(piece.unknown.size());
-            if (rest.starts_with('\n')) {
-                rest.remove_prefix(1);
+            if (result == MatchResult::Found) {
+                takeKnown(match, bytes.substr(at, match.length));
+                at += match.length;
+                if (at > lineEnd) {
+                    lineEnd = std::min(bytes.find('\n', at), bytes.size());
+                }
+            } else {
+                const std::string_view unknown = line.substr(0, findTrace(line));
+                takeUnknown(unknown);
+                at += unknown.size();
             }
         }
-        pieces.push_back(piece);
-    }
-    bool isFirst = true;
-    for (const Piece& piece : pieces) {
-        if (piece.isKnown) {
-            ++facts_.knownTexts;
-            facts_.gluedTexts += isFirst ? 0U : 1U;
-            inOpenText_ = piece.match.text == Text::OpenEnded;
-            builder_.take(piece.match, lineNumber_);
-        } else {
-            takeUnknown(piece.unknown);
+        if (at < bytes.size()) {
+            takeLineEnd();
+            ++at;
         }
-        isFirst = false;
     }
-    return Outcome::Taken;
+    return at;
+}
+
+void LogReader::takeKnown(const TextMatch& match, std::string_view bytes) {
+    ++facts_.knownTexts;
+    facts_.gluedTexts += isInLine_ ? 1 : 0;
+    facts_.knownBytes += bytes.size();
+    inOpenText_ = match.text == Text::OpenEnded;
+    builder_.take(match, line_);
+    line_ += static_cast<std::uint64_t>(lineEndsIn(bytes));
+    isInLine_ = true;
 }
 
 void LogReader::takeUnknown(std::string_view bytes) {
-    if (inOpenText_ || bytes.empty()) {
+    isInLine_ = true;
+    if (inOpenText_) {
+        facts_.knownBytes += bytes.size();
         return;
     }
+    facts_.unknownBytes += bytes.size();
     ++facts_.unknownPieces;
     if (facts_.unknownSamples.size() < maximumSamples) {
-        facts_.unknownSamples.push_back({lineNumber_, std::string(bytes.substr(0, sampleLength))});
+        facts_.unknownSamples.push_back({line_, std::string(bytes.substr(0, sampleLength))});
     }
+}
+
+void LogReader::takeLineEnd() {
+    ++facts_.knownBytes;
+    ++line_;
+    isInLine_ = false;
 }
 
 Model readLog(std::istream& input, const std::string& name) {

@@ -4,8 +4,8 @@
 #include "view/model_builder.hpp"
 #include "view/text_matcher.hpp"
 
+#include <cstddef>
 #include <cstdint>
-#include <deque>
 #include <istream>
 #include <string>
 #include <string_view>
@@ -25,20 +25,20 @@ public:
     Model finish();
 
 private:
-    enum class Outcome : unsigned char { Taken, NeedsMore };
-
     void takeLine(std::string_view line);
-    void drain(bool atEnd);
-    Outcome takeTexts(std::string_view bytes, bool mayWait);
+    std::size_t takeTexts(std::string_view bytes, bool mayWait);
+    void takeKnown(const TextMatch& match, std::string_view bytes);
     void takeUnknown(std::string_view bytes);
+    void takeLineEnd();
 
     TextMatcher matcher_;
     ModelBuilder builder_;
     LogFacts facts_;
-    std::string partialLine_;      // the beginning of a line whose end has not come yet
-    std::deque<std::string> held_; // lines whose first may go on in the next
-    std::uint64_t lineNumber_ = 0; // of the line being cut into texts
-    bool inOpenText_ = false;      // behind foreign text that may run over several lines
+    std::string partialLine_; // the beginning of a line whose end has not come yet
+    std::string held_;        // lines whose first text may go on in the next one
+    std::uint64_t line_ = 1;  // number of the line that is being cut into texts
+    bool isInLine_ = false;   // behind the first byte of that line
+    bool inOpenText_ = false; // behind foreign text that may run over several lines
 };
 
 // Reads a whole stream.

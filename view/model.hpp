@@ -204,6 +204,8 @@ struct LogFacts {
     std::string name;
     std::uint64_t bytes = 0;
     std::uint64_t lines = 0;
+    std::uint64_t knownBytes = 0;   // of known texts, of what they let follow, and of line ends
+    std::uint64_t unknownBytes = 0; // of all unknown pieces
     std::uint64_t knownTexts = 0;
     std::uint64_t gluedTexts = 0; // texts that stand on a line behind another one
     std::uint64_t unknownPieces = 0;

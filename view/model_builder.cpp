@@ -10,6 +10,10 @@ namespace view {
 
 namespace {
 
+// At most three texts tell why an identification failed: of page 0x83, of the standard data, of a stale
+// entry. Bytes that only look like a log may hold any number of them, and every device would repeat them all.
+constexpr std::size_t maximumCauses = 4;
+
 constexpr std::string_view inquiryFailedIdentifier = ":-( SCSI_Inquiry_Failed";
 
 template <typename Number>
@@ -648,6 +652,7 @@ void ModelBuilder::leaveTree() {
                             " has no disks");
             }
         }
+        sessions_.clear();
     }
     if (tree_ >= Tree::Fc && stateOf(tree_) == TreeState::Begun) {
         stateOf(tree_) = TreeState::Built;
@@ -747,7 +752,9 @@ void ModelBuilder::inquiryFailure(std::string_view words, bool isFailure) {
         cause += " (" + inquiry_.detail + ")";
     }
     inquiry_.detail.clear();
-    inquiry_.causes.push_back(std::move(cause));
+    if (inquiry_.causes.size() < maximumCauses) {
+        inquiry_.causes.push_back(std::move(cause));
+    }
     inquiry_.failed = inquiry_.failed || isFailure;
 }
 

@@ -7,20 +7,23 @@ namespace view {
 namespace {
 
 // A text that ends in a field and has no line end runs up to whatever comes next on its line.
-constexpr std::array<std::string_view, 5> followers = {
-    "Entered Function ", "Left Function ", "Line: ", "End of popened Buffer", "Incomplete line: ",
+constexpr std::array<std::string_view, 6> followers = {
+    "Entered Function ", "Left Function ", "Line: ", "End of popened Buffer", "Incomplete line: ", "\n",
 };
 constexpr std::string_view nextPowerPathEntry = "               ";
 
 // Below this many leading bytes a text is too common to wait for its rest.
 constexpr std::size_t shortestOpening = 8;
 
-// Ends of text fields tried before a line is given up; the texts themselves need one or two.
-constexpr int maximumAttempts = 256;
+// The longest text field, in bytes: PATH_MAX, and more than the 3999 that the program reads of a command's
+// output at once. What devices and libraries fill in is shorter: 510 hexadecimal digits of a designator, 256
+// characters of an HBA's attribute, 223 of an iSCSI name. Without a limit, each text of a long line would
+// search all of it.
+constexpr std::size_t longestField = 4096;
 
 std::size_t findFollower(Text text, std::string_view bytes, std::size_t from) {
-    for (std::size_t at = bytes.find_first_of("ELI ", from); at != std::string_view::npos;
-         at = bytes.find_first_of("ELI ", at + 1)) {
+    for (std::size_t at = bytes.find_first_of("ELI \n", from); at != std::string_view::npos;
+         at = bytes.find_first_of("ELI \n", at + 1)) {
         const std::string_view rest = bytes.substr(at);
         const auto begins = [rest](std::string_view follower) { return rest.starts_with(follower); };
         if (std::any_of(followers.begin(), followers.end(), begins) ||
@@ -29,6 +32,12 @@ std::size_t findFollower(Text text, std::string_view bytes, std::size_t from) {
         }
     }
     return bytes.size();
+}
+
+// The end of the line, as far as a field may reach.
+std::size_t findLineEnd(std::string_view bytes, std::size_t from) {
+    const std::string_view reach = bytes.substr(0, from + longestField + 1);
+    return std::min(reach.find('\n', from), reach.size());
 }
 
 bool isDecimal(char c) {
@@ -59,13 +68,12 @@ TextMatcher::TextMatcher(std::span<const KnownText> texts) : patternsByFirstByte
         const auto first = static_cast<unsigned char>(pattern.pieces.front().literal.front());
         patternsByFirstByte_[first].push_back(std::move(pattern));
     }
-    // A text with a line end goes before the same text without one, a longer opening before a shorter one.
+    // A longer opening goes before a shorter one, a text with a line end before the same text without one.
     for (std::vector<Pattern>& patterns : patternsByFirstByte_) {
         std::stable_sort(patterns.begin(), patterns.end(), [](const Pattern& a, const Pattern& b) {
-            if (a.endsLine != b.endsLine) {
-                return a.endsLine;
-            }
-            return a.pieces.front().literal.size() > b.pieces.front().literal.size();
+            const std::size_t openingOfA = a.pieces.front().literal.size();
+            const std::size_t openingOfB = b.pieces.front().literal.size();
+            return openingOfA != openingOfB ? openingOfA > openingOfB : a.endsLine && !b.endsLine;
         });
     }
 }
@@ -128,10 +136,7 @@ MatchResult TextMatcher::match(std::string_view bytes, TextMatch& match) const {
         if (!bytes.starts_with(opening)) {
             continue;
         }
-        match.text = pattern.text;
-        match.fieldCount = 0;
-        int attempts = maximumAttempts;
-        if (matchPieces(pattern, 0, bytes, 0, match, attempts)) {
+        if (matchPattern(pattern, bytes, match)) {
             return MatchResult::Found;
         }
         if (pattern.mayRunOver && opening.size() >= shortestOpening) {
@@ -141,45 +146,75 @@ MatchResult TextMatcher::match(std::string_view bytes, TextMatch& match) const {
     return result;
 }
 
-// Matches the pieces from number `piece` on against `bytes` from `at` on; backs out of a text field that was
-// taken too short.
-bool TextMatcher::matchPieces(const Pattern& pattern, std::size_t piece, std::string_view bytes,
-                              std::size_t at, TextMatch& match, int& attempts) {
-    if (piece == pattern.pieces.size()) {
-        match.length = at;
-        return !pattern.endsLine || at == bytes.size();
-    }
-    const auto& [literal, field] = pattern.pieces[piece];
-    if (!bytes.substr(at).starts_with(literal)) {
+// A text field ends at the first place behind which the pieces up to the next text field fit. No other end is
+// tried when those behind them do not fit: what is not there behind one place is not there behind a later
+// one. So the work grows with the bytes, whatever they are.
+bool TextMatcher::matchPattern(const Pattern& pattern, std::string_view bytes, TextMatch& match) {
+    match.text = pattern.text;
+    match.fieldCount = 0;
+    Position position;
+    if (!matchUpToText(pattern, bytes, position, match)) {
         return false;
     }
-    at += literal.size();
-    if (field == Field::None) {
-        return matchPieces(pattern, piece + 1, bytes, at, match, attempts);
-    }
-
-    const std::size_t slot = match.fieldCount;
-    const auto take = [&](std::size_t end) {
-        match.fields.at(slot) = bytes.substr(at, end - at);
-        match.fieldCount = slot + 1;
-        return matchPieces(pattern, piece + 1, bytes, end, match, attempts);
-    };
-    if (field == Field::Text) {
-        if (piece + 1 == pattern.pieces.size()) {
-            return take(pattern.endsLine ? bytes.size() : findFollower(pattern.text, bytes, at));
-        }
-        const std::string_view next = pattern.pieces[piece + 1].literal;
-        for (std::size_t end = bytes.find(next, at); end != std::string_view::npos && attempts > 0;
-             --attempts, end = bytes.find(next, end + 1)) {
-            if (take(end)) {
-                return true;
+    while (position.piece < pattern.pieces.size()) {
+        const std::string_view next = pattern.pieces[position.piece].literal;
+        const std::size_t start = position.at;
+        const std::size_t slot = match.fieldCount;
+        const std::string_view reach = bytes.substr(0, start + longestField + next.size());
+        Position behind;
+        for (std::size_t end = reach.find(next, start);; end = reach.find(next, end + 1)) {
+            if (end == std::string_view::npos) {
+                return false;
+            }
+            match.fields.at(slot) = bytes.substr(start, end - start);
+            match.fieldCount = slot + 1;
+            behind = {position.piece, end};
+            if (matchUpToText(pattern, bytes, behind, match)) {
+                break;
             }
         }
-        return false;
+        position = behind;
     }
+    match.length = position.at;
+    return true;
+}
 
+// Matches the pieces at `position` and moves it behind them: to the start of the next text field that a piece
+// follows, or to the end of the text.
+bool TextMatcher::matchUpToText(const Pattern& pattern, std::string_view bytes, Position& position,
+                                TextMatch& match) {
+    auto& [piece, at] = position;
+    while (piece < pattern.pieces.size()) {
+        const auto& [literal, field] = pattern.pieces[piece];
+        if (!bytes.substr(at).starts_with(literal)) {
+            return false;
+        }
+        at += literal.size();
+        ++piece;
+        if (field == Field::Text && piece < pattern.pieces.size()) {
+            return true;
+        }
+        if (field != Field::None) {
+            const std::size_t end = fieldEnd(pattern, field, bytes, at);
+            if (end == std::string_view::npos) {
+                return false;
+            }
+            match.fields.at(match.fieldCount++) = bytes.substr(at, end - at);
+            at = end;
+        }
+    }
+    return !pattern.endsLine || at == bytes.size() || bytes[at] == '\n';
+}
+
+// The end of the field at `at`, which is no text field that a piece follows; npos when there is no such
+// field.
+std::size_t TextMatcher::fieldEnd(const Pattern& pattern, Field field, std::string_view bytes,
+                                  std::size_t at) {
     std::size_t end = at;
     switch (field) {
+    case Field::Text:
+        end = pattern.endsLine ? findLineEnd(bytes, at) : findFollower(pattern.text, bytes, at);
+        return end - at <= longestField ? end : std::string_view::npos;
     case Field::Decimal:
         end = runEnd(bytes, at + (bytes.substr(at).starts_with('-') ? 1 : 0), isDecimal);
         break;
@@ -197,7 +232,7 @@ bool TextMatcher::matchPieces(const Pattern& pattern, std::size_t piece, std::st
         }
         break;
     }
-    return end > at && take(end);
+    return end > at ? end : std::string_view::npos;
 }
 
 } // namespace view

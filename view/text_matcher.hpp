@@ -33,7 +33,7 @@ public:
     explicit TextMatcher(std::span<const KnownText> texts);
 
     // Looks for a known text at the start of `bytes`, which hold one line of the log, or several when a field
-    // went over a line end, without the last line end. Fills `match` when the result is Found.
+    // may go over a line end. Fills `match` when the result is Found.
     [[nodiscard]] MatchResult match(std::string_view bytes, TextMatch& match) const;
 
 private:
@@ -52,10 +52,18 @@ private:
         std::vector<Piece> pieces;
     };
 
+    // How far a pattern has been matched.
+    struct Position {
+        std::size_t piece = 0;
+        std::size_t at = 0; // in the bytes
+    };
+
     static Pattern compile(const KnownText& known);
     static Piece takePiece(std::string_view& format);
-    static bool matchPieces(const Pattern& pattern, std::size_t piece, std::string_view bytes, std::size_t at,
-                            TextMatch& match, int& attempts);
+    static bool matchPattern(const Pattern& pattern, std::string_view bytes, TextMatch& match);
+    static bool matchUpToText(const Pattern& pattern, std::string_view bytes, Position& position,
+                              TextMatch& match);
+    static std::size_t fieldEnd(const Pattern& pattern, Field field, std::string_view bytes, std::size_t at);
 
     std::vector<std::vector<Pattern>> patternsByFirstByte_;
 };

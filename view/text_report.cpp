@@ -146,17 +146,19 @@ void writeFc(std::ostream& output, const Model& model, const Style& style) {
                      counted(fc.adapters.size(), "adapter") + ", " + counted(fc.paths.size(), "listed path"),
                      fc.state);
     using Target = std::pair<std::string, std::string>; // node and port
-    using Targets = std::vector<std::pair<Target, std::size_t>>;
+    struct Targets {
+        std::map<Target, std::size_t> places; // in the list
+        std::vector<std::pair<Target, std::size_t>> list;
+    };
     std::map<std::pair<std::size_t, std::string>, Targets> targetsOfPort;
     for (const FcPath& path : fc.paths) {
         Targets& targets = targetsOfPort[{path.adapter, path.initiator}];
         const Target target{path.targetNode, path.targetPort};
-        auto found = std::find_if(targets.begin(), targets.end(),
-                                  [&target](const auto& known) { return known.first == target; });
-        if (found == targets.end()) {
-            found = targets.insert(targets.end(), {target, 0});
+        const auto [place, isNew] = targets.places.try_emplace(target, targets.list.size());
+        if (isNew) {
+            targets.list.emplace_back(target, 0);
         }
-        ++found->second;
+        ++targets.list[place->second].second;
     }
     for (std::size_t i = 0; i < fc.adapters.size(); ++i) {
         const Adapter& adapter = fc.adapters[i];
@@ -171,7 +173,8 @@ void writeFc(std::ostream& output, const Model& model, const Style& style) {
         output << '\n';
         for (const std::string& initiator : adapter.initiators) {
             output << "    initiator " << printable(initiator) << '\n';
-            for (const auto& [target, luns] : targetsOfPort[{i, initiator}]) {
+            // A port that is listed twice shows its targets once.
+            for (const auto& [target, luns] : std::exchange(targetsOfPort[{i, initiator}].list, {})) {
                 output << "      target " << printable(target.second) << " of " << printable(target.first)
                        << "  " << counted(luns, "LUN") << '\n';
             }
