@@ -49,9 +49,15 @@ bool mayGoOn(std::string_view bytes) {
     return bytes.size() <= maximumHeldBytes && lineEndsIn(bytes) < maximumHeldLines;
 }
 
+// The one of all readers: it is the same for each of many logs.
+const TextMatcher& matcher() {
+    static const TextMatcher sMatcher(knownTexts());
+    return sMatcher;
+}
+
 } // namespace
 
-LogReader::LogReader(std::string name) : matcher_(knownTexts()) {
+LogReader::LogReader(std::string name) {
     facts_.name = std::move(name);
 }
 
@@ -107,13 +113,13 @@ std::size_t LogReader::takeTexts(std::string_view bytes, bool mayWait) {
         while (at < lineEnd) {
             const std::string_view line = bytes.substr(at, lineEnd - at);
             TextMatch match;
-            MatchResult result = matcher_.match(line, match);
+            MatchResult result = matcher().match(line, match);
             if (result == MatchResult::Unending && (isInLine_ || !inOpenText_)) {
                 const std::string_view lines = bytes.substr(at);
                 if (mayWait && mayGoOn(lines)) {
                     return at;
                 }
-                result = matcher_.match(lines, match);
+                result = matcher().match(lines, match);
             }
             if (result == MatchResult::Found) {
                 takeKnown(match, bytes.substr(at, match.length));

@@ -31,7 +31,6 @@ private:
     void takeUnknown(std::string_view bytes);
     void takeLineEnd();
 
-    TextMatcher matcher_;
     ModelBuilder builder_;
     LogFacts facts_;
     std::string partialLine_; // the beginning of a line whose end has not come yet

@@ -44,13 +44,6 @@ bool isDeviceNode(const char* path) {
 
 } // namespace
 
-void require(bool condition, const char* message) {
-    if (!condition) {
-        static_cast<void>(std::fprintf(stderr, "broken: %s\n", message));
-        std::abort();
-    }
-}
-
 void runInput(std::initializer_list<std::string_view> fatalConditions, const std::function<void()>& body) {
     if (gLogStream == nullptr) {
         gLogStream = openLogSink();

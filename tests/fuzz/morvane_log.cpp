@@ -1,0 +1,105 @@
+// A log, read by morvane-view and shown in every way it has. The input is two bytes for the sizes of the
+// chunks that the log comes in, which take turns (0: all there is), and then the log.
+#include <algorithm>
+#include <array>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "tests/fuzz/input.hpp"
+#include "view/diff.hpp"
+#include "view/escape.hpp"
+#include "view/html_page.hpp"
+#include "view/json_report.hpp"
+#include "view/log_reader.hpp"
+#include "view/san.hpp"
+#include "view/text_report.hpp"
+
+namespace {
+
+using view::Model;
+
+Model readStream(std::string_view log) {
+    std::istringstream input{std::string(log)};
+    return view::readLog(input, "log");
+}
+
+Model readChunks(std::string_view log, const std::array<std::size_t, 2>& sizes) {
+    view::LogReader reader("log");
+    for (std::size_t chunk = 0; !log.empty(); ++chunk) {
+        const std::size_t wanted = sizes.at(chunk % sizes.size());
+        const std::string_view bytes = log.substr(0, wanted != 0 ? wanted : log.size());
+        reader.feed(bytes);
+        log.remove_prefix(bytes.size());
+    }
+    return reader.finish();
+}
+
+// Every byte and every line of the log is accounted for.
+void checkFacts(const view::LogFacts& facts, std::string_view log) {
+    require(facts.bytes == log.size(), "bytes lost or made up");
+    require(facts.knownBytes + facts.unknownBytes == log.size(), "bytes neither known nor unknown");
+    require((facts.unknownPieces == 0) == (facts.unknownBytes == 0), "unknown pieces without bytes");
+    const auto lineEnds = static_cast<std::uint64_t>(std::count(log.begin(), log.end(), '\n'));
+    require(facts.cutInLine == (!log.empty() && log.back() != '\n'), "a last line with a wrong end");
+    require(facts.lines == lineEnds + (facts.cutInLine ? 1 : 0), "lines lost or made up");
+}
+
+// Writes something as text, all of which must be fit to be shown: as a line, it is its own printable form but
+// for the backslashes, which the escapes of what comes from the log have.
+template <typename Shown>
+void checkText(const Shown& shown) {
+    std::ostringstream output;
+    view::writeText(output, shown, view::Style::of(false));
+    std::string text = output.str();
+    text.erase(std::remove(text.begin(), text.end(), '\n'), text.end());
+    const auto isControl = [](char c) { return static_cast<unsigned char>(c) < 0x20 || c == 0x7f; };
+    require(std::none_of(text.begin(), text.end(), isControl), "a control character in the text");
+    const auto backslashes = static_cast<std::size_t>(std::count(text.begin(), text.end(), '\\'));
+    require(view::printable(text).size() == text.size() + backslashes, "text that is not fit to be shown");
+}
+
+// Writes a page, whose document must not bring any markup into it.
+void checkPage(const nlohmann::ordered_json& document) {
+    const auto markup = [](const nlohmann::ordered_json& shown) {
+        std::ostringstream output;
+        view::writePage(output, shown);
+        const std::string page = output.str();
+        return std::count(page.begin(), page.end(), '<');
+    };
+    static const auto templateMarkup = markup({});
+    require(markup(document) == templateMarkup, "markup from the log");
+}
+
+void checkDifference(const Model& before, const Model& after) {
+    const view::Difference difference = view::compare(before, after);
+    checkText(difference);
+    static_cast<void>(view::toJson(difference).dump()); // which throws for what is not UTF-8
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8* data, std::size_t size) {
+    Input input(data, size);
+    const std::array<std::size_t, 2> sizes = {input.byte(), input.byte()};
+    const std::string_view log = input.rest();
+    const std::string_view half = log.substr(0, log.size() / 2);
+
+    const std::vector<Model> reports = {readStream(log), readStream(half),
+                                        readStream(log.substr(half.size()))};
+    const Model& report = reports.front();
+    checkFacts(report.log, log);
+    checkText(report);
+    const nlohmann::ordered_json document = view::toJson(report);
+    require(document.dump() == view::toJson(readChunks(log, sizes)).dump(), "chunks that change the report");
+    checkPage(document);
+
+    require(view::compare(report, report).isEmpty(), "a log that differs from itself");
+    checkDifference(reports[1], reports[2]);
+    checkDifference(reports[2], reports[1]);
+
+    const view::San san = view::join(reports);
+    checkText(san);
+    static_cast<void>(view::toJson(san).dump());
+    return 0;
+}
