@@ -1,0 +1,291 @@
+#include "view/model_builder.hpp"
+
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "tests/view/reading.hpp"
+
+namespace {
+
+using view::Model;
+
+using Lines = std::vector<std::string>;
+
+const std::string kOpening = "Going to open Adapter #0 - 'acme-0'\n";
+const std::string kAdapterLines = "|_ Adapter wwnn 20:01\n|  |_ Initiator wwpn 10:01\n";
+const std::string kTargetLine = "|  |  |_ Target wwnn 50:01 wwpn 52:01 bus 2 target# 3\n";
+
+std::string lunLine(const std::string& device, const std::string& identifier, const std::string& lun = "4") {
+    return "|  |  |  |_ lun name " + device + " luid " + identifier + " oslun " + lun +
+           " fcid 66049 fcplun 0" + lun + "\n";
+}
+
+// What the log has of a LUN whose page 83h holds an NAA designator, up to its unique identifier.
+std::string identified(const std::string& device, const std::string& identifier) {
+    return "Added to DevMap 12 --> " + device +
+           " --> 1\nEntered Function HA_GetScsiUniqueLunId Line 1\nGet LunID\n" +
+           "Found NaaId: " + identifier + " \nOld Unique LunId = x, New Unique LunId = " + identifier +
+           "\nUniqueLunid = " + identifier + " size = 1\n";
+}
+
+// Problems and notes, one a line: severity, tree, subject, cause, line.
+Lines problemsOf(const Model& model) {
+    Lines lines;
+    const auto problems = view::toJson(model)["problems"];
+    for (const auto& problem : problems) {
+        lines.push_back(problem["severity"].get<std::string>() + ", " + problem["tree"].get<std::string>() +
+                        ", " + problem["subject"].get<std::string>() + ": " +
+                        problem["cause"].get<std::string>() + ", line " + problem["line"].dump());
+    }
+    return lines;
+}
+
+// The problems of a run whose texts are `texts`; line 1 is its beginning.
+Lines problemsOfRun(const std::string& texts) {
+    return problemsOf(modelOf(runStart + texts + runEnd));
+}
+
+TEST(ModelBuilder, JoinsThePartsOfAnFcPath) {
+    const Model model = modelOf(
+        fcBanner + kOpening + "Adapter info: Manufacturer ACME Model A 8 NumPorts=1\n" +
+        "The number of targets is 1\nVendor DISKCO ProductId ARRAY 9 ProductRev 1.0\n" +
+        identified("/dev/sdb", "6") + "Pseudo Device for Unique LunId 6 is emcpowera\n" + kAdapterLines +
+        kTargetLine + lunLine("/dev/sdb", "6") + "Time taken to build tree: 12.50 milliseconds\n" + runEnd);
+    EXPECT_EQ(
+        sectionOf(model, "fc"),
+        R"({"state":"built","loadMilliseconds":null,"buildMilliseconds":12.5,"adapters":[{"number":0,)"
+        R"("name":"acme-0","manufacturer":"ACME","model":"A 8","node":"20:01","state":"reported","cause":null,)"
+        R"("mappingEntries":1,"initiators":["10:01"],"unlisted":[]}],"paths":[{"adapter":0,)"
+        R"("initiator":"10:01","targetNode":"50:01","targetPort":"52:01","bus":2,"target":3,)"
+        R"("device":"/dev/sdb","lun":4,"fcId":66049,"fcpLun":"4","identifier":"6","identifierKind":"naa",)"
+        R"("vendor":"DISKCO","product":"ARRAY 9","revision":"1.0","pseudoDevice":"emcpowera"}]})");
+    EXPECT_EQ(problemsOf(model), Lines());
+}
+
+TEST(ModelBuilder, ReadsAnFcTreeWhoseProgressIsMissing) {
+    const Model model = modelOf(kAdapterLines + kTargetLine + lunLine("/dev/sdb", "6") + kAdapterLines +
+                                kTargetLine + lunLine("/dev/sdc", "7") + runEnd);
+    ASSERT_EQ(model.fc.paths.size(), 2);
+    EXPECT_EQ(model.fc.adapters.size(), 2);
+    EXPECT_EQ(model.fc.paths[1].adapter, 1);
+    EXPECT_EQ(model.fc.paths[1].device, "/dev/sdc");
+}
+
+TEST(ModelBuilder, TakesAnEmptySlotForNoPathAndTheLunThatItDisplacedForUnlisted) {
+    const Model model =
+        modelOf(runStart + fcBanner + kOpening + identified("/dev/sdb", "6") + identified("/dev/sdc", "7") +
+                kAdapterLines + kTargetLine + lunLine("", "", "0") + lunLine("/dev/sdb", "6") + runEnd);
+    ASSERT_EQ(model.fc.paths.size(), 1);
+    EXPECT_EQ(model.fc.paths[0].device, "/dev/sdb");
+    ASSERT_EQ(model.fc.adapters.size(), 1);
+    ASSERT_EQ(model.fc.adapters[0].unlisted.size(), 1);
+    EXPECT_EQ(model.fc.adapters[0].unlisted[0].device, "/dev/sdc");
+    EXPECT_EQ(
+        problemsOf(model),
+        Lines{
+            "problem, fc, /dev/sdc: identified as 7, but not listed in the tree: an earlier LUN of the adapter "
+            "was dropped, and the tree lists as many entries as were kept, counted from the first, line 21"});
+}
+
+TEST(ModelBuilder, TellsWhichLunWasDroppedAndWhy) {
+    EXPECT_EQ(
+        problemsOfRun(fcBanner + kOpening +
+                      "Failed in getting the VendorId for device /dev/sdb Lun 5 Under Target 52:01 ignoring\n"
+                      "Entered Function HA_GetScsiUniqueLunId Line 1\nGet LunID\nTimeout\n"
+                      "Time-out in Reading VPD 0x83 Page\nioctl failed, error code = 5\n"
+                      "SCSI Ioctl Failure for Std Inquiry Data\n"
+                      "Failed in getting the uniqueLunId for device /dev/sdb ignoring\n"),
+        Lines{
+            "problem, fc, /dev/sdb (LUN 5 of target 52:01): dropped: reading page 0x83 timed out; the standard "
+            "INQUIRY failed in the kernel (errno 5, Input/output error), line 11"});
+}
+
+TEST(ModelBuilder, TellsAtMostFourCauses) {
+    std::string texts = fcBanner + kOpening;
+    for (unsigned i = 0; i < 9; ++i) {
+        texts += "GotStatus:Category=2; Code=" + std::to_string(i) + ";\nSCSI Error for VPD 0x83 Inquiry\n";
+    }
+    const std::string cause = "reading page 0x83 ended with a SCSI error (SCSI status ";
+    EXPECT_EQ(problemsOfRun(texts + "Failed in getting the uniqueLunId for device /dev/sdb ignoring\n"),
+              Lines{"problem, fc, /dev/sdb: dropped: " + cause + "0); " + cause + "1); " + cause + "2); " +
+                    cause + "3), line 22"});
+}
+
+TEST(ModelBuilder, NotesALunWithoutADeviceOnceForBothPasses) {
+    const std::string unnamed = "Device Name Unassigned for Lun 5 under Target 52:01 ignoring\n";
+    EXPECT_EQ(
+        problemsOfRun(fcBanner + kOpening + unnamed + unnamed),
+        Lines{
+            "problem, fc, LUN 5: dropped: target 52:01 offers it, but the host has no device for it, line 4"});
+}
+
+TEST(ModelBuilder, TellsWhyAnAdapterIsMissing) {
+    EXPECT_EQ(
+        problemsOfRun(fcBanner + kOpening + "Failed to get adapter attributes - HBA_STATUS_ERROR\n" +
+                      "Exception occured while opening adapter: acme-0\n" + kOpening +
+                      "Encountered non-supported Adapter - HBA_STATUS_ERROR_NOT_SUPPORTED\n"),
+        (Lines{
+            "problem, fc, acme-0: abandoned, none of its LUNs is reported: its attributes could not be read: "
+            "HBA_STATUS_ERROR, line 5",
+            "note, fc, acme-0: its HBA library does not support it: HBA_STATUS_ERROR_NOT_SUPPORTED, line 7"}));
+}
+
+TEST(ModelBuilder, TellsWhyATreeEnded) {
+    EXPECT_EQ(
+        problemsOfRun(fcBanner + "Failed to load HBAAPI library : HBA_STATUS_ERROR\n" +
+                      "Caught an Hbaapi Exception in testing 'BuildFcTree\n'" + iscsiBanner +
+                      "Failed to open pipe for /sbin/iscsiadm!\n\nCannot proceed with building ISCSI tree\n" +
+                      dasBanner + "Caught exception while building DAS tree: no memory\n\n"),
+        (Lines{"problem, fc, FC: the tree was ended early: the HBA library could not be loaded: "
+               "HBA_STATUS_ERROR, line 4",
+               "problem, iscsi, ISCSI: the tree was ended early: iscsiadm could not be started, line 8",
+               "problem, direct, DAS: the tree was ended early: no memory, line 10"}));
+}
+
+TEST(ModelBuilder, TakesAHostWithoutAdaptersForABuiltTree) {
+    const Model model =
+        modelOf(runStart + fcBanner +
+                "Caught exception while building FC tree: There are no adapters on the system\n\n" + runEnd);
+    EXPECT_EQ(model.fc.state, view::TreeState::Built);
+    EXPECT_EQ(problemsOf(model),
+              Lines{"note, fc, FC: the HBA library lists no Fibre Channel adapter, line 3"});
+}
+
+TEST(ModelBuilder, JoinsThePartsOfAnIscsiPath) {
+    const Model model = modelOf(
+        runStart + iscsiBanner +
+        "Target IQN 'iqn.t'\nTarget IP '10.0.0.2'\nAdded to DevMap 1 --> /dev/sdc --> 4\n" +
+        "Entered Function HA_GetScsiUniqueLunId Line 1\nFound T10 Id: ACME \nOld Unique LunId = x, New Unique LunId = "
+        "ACME\nRegister new iSCSI path: init_wwnn=iqn.i, init_wwpn=10.0.0.1, tgt_wwnn=iqn.t, tgt_wwpn=10.0.0.2, lun=7\n"
+        "|_ Initiator IQN  iqn.i\n|  |_ Target IQN iqn.t\n         10.0.0.1 <---> 10.0.0.2\n"
+        "|  |  |  |_ Device_Name: /dev/sdc sScsiOSLun: 7 LunId: ACME\n\n" +
+        runEnd);
+    EXPECT_EQ(
+        sectionOf(model, "iscsi"),
+        R"({"state":"built","paths":[{"initiatorIqn":"iqn.i","initiatorPort":"10.0.0.1","targetIqn":"iqn.t",)"
+        R"("targetAddress":"10.0.0.2","device":"/dev/sdc","lun":7,"identifier":"ACME","identifierKind":"t10"}]})");
+    EXPECT_EQ(problemsOf(model), Lines());
+}
+
+TEST(ModelBuilder, TellsWhyAnIscsiDiskHasNoIdentifier) {
+    const Model model = modelOf(
+        runStart + iscsiBanner +
+        "Target IQN 'iqn.t'\nTarget IP '10.0.0.2'\nAdded to DevMap 1 --> /dev/sdc --> 4\n" +
+        "Entered Function HA_GetScsiUniqueLunId Line 1\nCannot do Scsi Inquiry on /dev/sdc - No such device\n" +
+        "Register new iSCSI path: init_wwnn=iqn.i, init_wwpn=a, tgt_wwnn=iqn.t, tgt_wwpn=b, lun=7\n"
+        "|  |_ Target IQN iqn.t\n|  |  |  |_ Device_Name: /dev/sdc sScsiOSLun: 7 LunId: :-( SCSI_Inquiry_Failed\n\n" +
+        runEnd);
+    ASSERT_EQ(model.iscsi.paths.size(), 1);
+    EXPECT_EQ(model.iscsi.paths[0].identifier.kind, view::IdentifierKind::None);
+    EXPECT_EQ(
+        problemsOf(model),
+        Lines{
+            "problem, iscsi, /dev/sdc (LUN 7 of iqn.t): its identifier could not be read: the device node could "
+            "not be opened: No such device, line 10"});
+}
+
+TEST(ModelBuilder, TellsWhatAnIgnoredIscsiDiskLacks) {
+    EXPECT_EQ(
+        problemsOfRun(
+            iscsiBanner + "Target IQN 'iqn.t'\nAdded to DevMap 1 --> /dev/sdc --> 4\n" +
+            "Register new iSCSI path: init_wwnn=iqn.i, init_wwpn=<empty>, tgt_wwnn=iqn.t, tgt_wwpn=, "
+            "lun=-1\nIgnoring device /dev/sdc, some param missing!\n"),
+        Lines{
+            "problem, iscsi, /dev/sdc: not reported: the session listing does not give its initiator address, "
+            "target address, LUN number, line 6"});
+}
+
+TEST(ModelBuilder, NotesASessionWithoutDisksOnce) {
+    EXPECT_EQ(
+        problemsOfRun(iscsiBanner + "Target IQN 'iqn.t'\nTarget IP '10.0.0.2'\n" + iscsiBanner + dasBanner),
+        Lines{"note, iscsi, iqn.t: the session to 10.0.0.2 has no disks, line 3"});
+}
+
+TEST(ModelBuilder, KnowsADirectDiskByItsHostAndTheReason) {
+    const Model model =
+        modelOf(runStart + dasBanner + "Entered Function HA_GetScsiUniqueLunId Line 1\n" +
+                "ioctl failed, error code = 25\n\nCaught exception -> ioctl failed, error code = 25\n : "
+                "Adding host name as LUN ID if the device is DAS and rejecting otherwise...\n" +
+                diskLine("/dev/vda", "db1::/dev/vda") + runEnd);
+    EXPECT_EQ(sectionOf(model, "direct"),
+              R"({"state":"built","devices":[{"device":"/dev/vda","identifier":"db1::/dev/vda",)"
+              R"("identifierKind":"host-name"}]})");
+    EXPECT_EQ(model.host, "db1");
+    EXPECT_EQ(problemsOf(model),
+              Lines{"note, direct, /dev/vda: known by the host's name only: the first INQUIRY failed "
+                    "(errno 25, Inappropriate ioctl for device), line 8"});
+}
+
+TEST(ModelBuilder, TellsWhyADirectDeviceIsNotSupported) {
+    const std::string begun = "Entered Function HA_GetScsiUniqueLunId Line 1\n";
+    EXPECT_EQ(
+        problemsOfRun(
+            dasBanner + begun + "--------> Device Name: |/dev/sr0| is not supported\n\n" + begun +
+            "Cannot do Scsi Inquiry on /dev/sdb - No medium found\n--------> Device Name: |/dev/sdb| is "
+            "not supported\n\n"),
+        (Lines{
+            "problem, direct, /dev/sdb: not reported: the device node could not be opened: No medium found, "
+            "line 8",
+            "note, direct, /dev/sr0: not reported: its device type is neither disk nor storage array "
+            "controller, line 4"}));
+}
+
+TEST(ModelBuilder, ListsLogicalDevicesAndTheirHost) {
+    const Model model =
+        modelOf("============ LOGICAL DEVICE DETAILS ============\n--------> Device Name: |/dev/sda1| LunId: "
+                "|db1 :: /dev/sda1| \n--------> Device Name: |/dev/dm-0| LunId: |db1 :: /dev/dm-0| \n" +
+                runEnd);
+    EXPECT_EQ(sectionOf(model, "logical"), R"({"state":"built","devices":["/dev/sda1","/dev/dm-0"]})");
+    EXPECT_EQ(model.host, "db1");
+}
+
+TEST(ModelBuilder, ListsPowerPathsDevices) {
+    const Model model = modelOf(runStart +
+                                "PowerPath Data : Ulid  Pseudo Name\n               6 emcpowera             "
+                                "  7 emcpowerb\n" +
+                                runEnd);
+    EXPECT_EQ(sectionOf(model, "multipath"),
+              R"({"powerPath":"running","devices":[{"ulid":"6","pseudoDevice":"emcpowera"},)"
+              R"({"ulid":"7","pseudoDevice":"emcpowerb"}]})");
+}
+
+TEST(ModelBuilder, TakesANumberThatIsTooGreatForTheGreatest) {
+    const Model model = modelOf(fcBanner + kAdapterLines + kTargetLine +
+                                lunLine("/dev/sdb", "6", "99999999999999999999") + runEnd);
+    ASSERT_EQ(model.fc.paths.size(), 1);
+    EXPECT_EQ(model.fc.paths[0].lun, UINT64_MAX);
+}
+
+TEST(ModelBuilder, SaysWhereALogIsCut) {
+    const std::string end =
+        ", without the closing banner: the run is still going on or was ended, or the file was cut "
+        "off, line ";
+    EXPECT_EQ(problemsOf(modelOf(runStart)),
+              Lines{"problem, multipath, log: it ends in the multipath section" + end + "1"});
+    EXPECT_EQ(problemsOf(modelOf(runStart + dasBanner + diskLine("/dev/sda", "6"))),
+              Lines{"problem, direct, log: it ends in the DAS section" + end + "3"});
+}
+
+TEST(ModelBuilder, SaysThatAnAssertionEndedTheRunAndNotThatTheLogIsCut) {
+    EXPECT_EQ(
+        problemsOf(modelOf(runStart + "Assertion [ lPos != ZebString::npos ] failed\n")),
+        Lines{
+            "problem, multipath, run: the program found something that must not be and ended itself: lPos != "
+            "ZebString::npos, line 2"});
+}
+
+TEST(ModelBuilder, ForgetsARunWhenTheNextBegins) {
+    const std::string second = runStart + fcBanner + kOpening + runEnd;
+    const Model alone = modelOf(second);
+    const Model after =
+        modelOf(runStart + fcBanner + kOpening + identified("/dev/sdb", "6") + kAdapterLines + kTargetLine +
+                lunLine("/dev/sdb", "6") + iscsiBanner + "Target IQN 'iqn.t'\n" + second);
+    for (const char* section :
+         {"host", "luns", "multipath", "fc", "iscsi", "direct", "logical", "problems"}) {
+        EXPECT_EQ(sectionOf(after, section), sectionOf(alone, section));
+    }
+}
+
+} // namespace
