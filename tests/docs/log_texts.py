@@ -1,7 +1,7 @@
-"""Holds docs/log-format.md against the program's sources: log_texts.py ROOT
+"""Holds docs/log-format.md against the program's sources and the reader of logs: log_texts.py ROOT
 
 Every text that the page quotes is a string literal of the program, and every literal that the program hands to a
-log function is quoted on the page.
+log function is quoted on the page. Every text on the page is one that morvane-view knows, and the other way round.
 """
 
 import pathlib
@@ -12,14 +12,53 @@ FOLDERS = ["main", "foundation", "fc", "host", "scsi", "multipath"]
 LITERAL = r'"(?:[^"\\\n]|\\.)*"'
 # Texts that only carry other texts.
 CARRIERS = {'"%s"', '"%s\\n"', '" %s\\n"'}
+# Texts from which the program puts a line together; the reader knows the line.
+PIECES = {'"\\n"', '" %s\\n"', '"|_ Adapter wwnn "', '"|  |_ Initiator wwpn "', '"|  |  |_ Target wwnn "', '" wwpn "',
+          '" bus %u target# %u\\n"', '"|_ Initiator IQN "', '"|  |_ Target IQN"'}
+LINES = {'"|_ Adapter wwnn %s\\n"', '"|  |_ Initiator wwpn %s\\n"',
+         '"|  |  |_ Target wwnn %s wwpn %s bus %u target# %u\\n"', '"|_ Initiator IQN  %s\\n"',
+         '"|  |_ Target IQN %s\\n"'}
+# Texts that stand within the fields of others.
+VALUES = {'"::"', '" :: "', '":-( SCSI_Inquiry_Failed"', '"Invalid Hbaapi Status Code"'}
+# Of the two texts that close a quote on the next line, the reader knows the quote as a text of its own.
+QUOTE = '"\'"'
+
+
+def literals_of(path):
+    """A source's text, in which a literal that is split over lines is one literal."""
+    return re.sub(r'(?<!\\)"\s*\n\s*"', "", path.read_text())
 
 
 def sources(root):
     for folder in FOLDERS:
         for path in sorted((root / folder).glob("*.[ch]pp")):
-            text = path.read_text()
-            # A literal that is split over lines is one literal.
-            yield re.sub(r'(?<!\\)"\s*\n\s*"', "", text)
+            yield literals_of(path)
+
+
+def form(text):
+    """What the reader and the page have in common of a text: the line ends before it and the empty lines behind it
+    are not part of it, a text field reads an address as well, and a sign, a width or a precision is no matter."""
+    text = re.sub(r"^(?:\\n)+", "", text[1:-1])
+    text = re.sub(r"(?:\\n)+'?$", r"\\n", text)
+    if re.fullmatch("=+ [A-Z ]+ =+", text):
+        text += r"\n"  # the rule behind a tree's name begins with the line end
+    text = re.sub(r"%[-0-9.]*l?([a-z])", r"%\1", text)
+    return text.replace("%d", "%u").replace("%p", "%s")
+
+
+def compare_with_reader(root, quoted):
+    """Prints what only the page or only the reader has; whether there is any."""
+    known = set(re.findall(rf"\{{Text::\w+,\s*({LITERAL})\}}", literals_of(root / "view/known_texts.cpp")))
+    on_page = {form(text): text for text in quoted - PIECES - VALUES}
+    in_reader = {form(text): text for text in known - LINES - {QUOTE}}
+    unknown = sorted(on_page[text] for text in on_page.keys() - in_reader.keys())
+    unwritten = sorted(in_reader[text] for text in in_reader.keys() - on_page.keys())
+    for text in unknown:
+        print("quoted, but not known to morvane-view:", text)
+    for text in unwritten:
+        print("known to morvane-view, but not quoted:", text)
+    print(f"{len(known)} texts known to morvane-view")
+    return bool(unknown or unwritten or len(known) < 150)
 
 
 def main():
@@ -39,7 +78,8 @@ def main():
     for text in unquoted:
         print("written to the log, but not quoted:", text)
     print(f"{len(quoted)} texts quoted, {len(logged)} handed to a log function")
-    return 1 if missing or unquoted or len(quoted) < 150 else 0
+    differs = compare_with_reader(root, quoted)
+    return 1 if missing or unquoted or len(quoted) < 150 or differs else 0
 
 
 if __name__ == "__main__":
