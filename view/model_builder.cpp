@@ -503,7 +503,7 @@ bool ModelBuilder::takeDevices(const TextMatch& match) {
         treeEnded(Tree::Direct, "/sys/block could not be opened");
         return true;
     case Text::LogicalFailed:
-        treeEnded(Tree::Logical, "/proc/partitions could not be read to its end");
+        treeEnded(Tree::Logical, "/proc/partitions could not be opened or not be read to its end");
         return true;
     default:
         return false;
