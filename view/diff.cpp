@@ -37,7 +37,7 @@ PathsByPlace pathsByPlace(const Model& model) {
     PathsByPlace places;
     for (std::size_t i = 0; i < model.fc.paths.size(); ++i) {
         const FcPath& path = model.fc.paths[i];
-        places["fc\n" + path.initiator + '\n' + path.targetPort + '\n' + path.fcpLun].push_back(
+        places["fc\n" + path.initiator + '\n' + path.targetPort + '\n' + lunNumbers(path)].push_back(
             {describe(model, {Sighting::Place::FcPath, i, 0}), readIdentifier(path.identifier)});
     }
     for (std::size_t i = 0; i < model.iscsi.paths.size(); ++i) {

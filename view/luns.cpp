@@ -19,7 +19,8 @@ public:
         for (std::size_t i = 0; i < model_.fc.paths.size(); ++i) {
             const FcPath& path = model_.fc.paths[i];
             add({Sighting::Place::FcPath, i, 0}, path.identifier, path.facts, path.device);
-            addPlace(path.identifier.text, std::to_string(path.adapter) + ' ' + path.targetPort, path.fcpLun);
+            addPlace(path.identifier.text, std::to_string(path.adapter) + ' ' + path.targetPort,
+                     lunNumbers(path));
         }
         for (std::size_t i = 0; i < model_.fc.adapters.size(); ++i) {
             const Adapter& adapter = model_.fc.adapters[i];

@@ -90,6 +90,12 @@ struct FcPath {
     DeviceFacts facts;
 };
 
+// Both LUN numbers of a path as one text. Either alone may be the same for all LUNs of a target: a library
+// may hold the FCP LUN in the upper 32 bits, which the log does not show.
+inline std::string lunNumbers(const FcPath& path) {
+    return std::to_string(path.lun) + ' ' + path.fcpLun;
+}
+
 // A LUN that was found on an adapter and identified, but has no line in its tree.
 struct UnlistedLun {
     std::string device;

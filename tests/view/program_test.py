@@ -123,6 +123,15 @@ class Diff(unittest.TestCase):
                          {("600A0B80000000000000000000000001", other.decode(), True)})
         self.assertEqual((len(document["identityChanges"]), document["lostPaths"]), (4, []))
 
+    def test_luns_of_one_fcp_lun_are_told_apart_by_the_numbers_of_the_host(self):
+        before = re.sub(rb"fcplun 0\w+", b"fcplun 00", make_log.healthy().bytes())
+        first = rb"\|  \|  \|  \|_ lun name \S+ luid 600A0B80000000000000000000000000 .*\n"
+        last = rb"(\|  \|  \|  \|_ lun name \S+) luid 600A0B80000000000000000000000002 "
+        after = re.sub(first, b"", re.sub(last, rb"\1 luid 600A0B80000000000000000000000009 ", before))
+        status, document = self.compare(before, after)
+        self.assertEqual((status, len(document["lostPaths"])), (1, 4))
+        self.assertEqual({(c["before"][-1], c["after"][-1]) for c in document["identityChanges"]}, {("2", "9")})
+
     def test_a_lost_adapter_shows_as_lost_paths_and_smaller_counts(self):
         before = make_log.healthy().bytes()
         start = before.index(b"Going to open Adapter #1")
