@@ -52,17 +52,21 @@ PathsByPlace pathsByPlace(const Model& model) {
 
 // Takes away from both lists what they have in common.
 void cancel(std::vector<ListedPath>& before, std::vector<ListedPath>& after) {
-    for (auto path = before.begin(); path != before.end();) {
-        const auto same = std::find_if(after.begin(), after.end(), [&path](const ListedPath& other) {
-            return other.identifier == path->identifier;
-        });
-        if (same == after.end()) {
-            ++path;
-        } else {
-            after.erase(same);
-            path = before.erase(path);
-        }
+    std::unordered_map<std::optional<std::string>, std::size_t> offered;
+    for (const ListedPath& path : after) {
+        ++offered[path.identifier];
     }
+    std::unordered_map<std::optional<std::string>, std::size_t> matched;
+    std::erase_if(before, [&](const ListedPath& path) {
+        const bool isSame = matched[path.identifier] < offered[path.identifier];
+        matched[path.identifier] += isSame ? 1 : 0;
+        return isSame;
+    });
+    std::erase_if(after, [&](const ListedPath& path) {
+        const bool isSame = matched[path.identifier] > 0;
+        matched[path.identifier] -= isSame ? 1 : 0;
+        return isSame;
+    });
 }
 
 std::unordered_map<std::string, std::size_t> unlistedCounts(const Model& model) {
