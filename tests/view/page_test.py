@@ -30,7 +30,7 @@ class Page(unittest.TestCase):
     @classmethod
     def setUpClass(cls):
         options = webdriver.ChromeOptions()
-        for flag in ("--headless --no-sandbox --disable-gpu --disable-quic --no-first-run "
+        for flag in ("--headless --no-sandbox --disable-gpu --disable-dev-shm-usage --disable-quic --no-first-run "
                      "--disable-background-networking --disable-component-update --disable-sync "
                      "--window-size=1400,1800").split():
             options.add_argument(flag)
