@@ -114,7 +114,7 @@
       const node = nodeOf(hostNodes, host.name, () => ({ kind: "host", label: host.name, find: host.name }));
       for (const [key, port] of host.initiators) {
         node.children.add(nodeOf(initiators, `${host.name} ${key}`,
-          () => ({ kind: "initiator", label: port.name, detail: port.detail, find: port.name })));
+          () => ({ kind: "initiator", label: port.name, detail: port.detail, find: port.name, host })));
       }
     }
     for (const lun of luns.values()) {
@@ -124,7 +124,7 @@
       lun.box = box;
       for (const path of lun.paths) {
         const initiator = nodeOf(initiators, `${path.host.name} ${path.initiator}`,
-          () => ({ kind: "initiator", label: path.initiator, detail: "", find: path.initiator }));
+          () => ({ kind: "initiator", label: path.initiator, detail: "", find: path.initiator, host: path.host }));
         hostNodes.get(path.host.name).children.add(initiator);
         const own = path.kind === "direct" || path.kind === "FC, not listed";
         const target = nodeOf(targets, own ? `${path.host.name} ${path.initiator} ${path.target}` : path.target,
@@ -150,7 +150,8 @@
         node.height = rowHeight + 2;
         node.wish = centres.length ? centres.reduce((a, b) => a + b, 0) / centres.length - node.height / 2 : 0;
       }
-      list.sort((a, b) => a.wish - b.wish);
+      // A host's ports stand together.
+      list.sort((a, b) => hosts.indexOf(a.host) - hosts.indexOf(b.host) || a.wish - b.wish);
       let next = 40;
       for (const node of list) {
         node.y = Math.max(node.wish, next);
@@ -261,6 +262,7 @@
     const bad = list.filter((p) => p.severity === "problem");
     const notes = list.filter((p) => p.severity === "note");
     const item = (p) => `<div class="${p.severity}"><b>${esc(p.subject)}</b> <span class="faint">${many ? `${esc(p.host.name)}, ` : ""}${esc(p.tree)}${p.line ? `, line ${p.line}` : ""}</span><br>${esc(p.cause)}</div>`;
+    byId("notes").innerHTML = notes.length ? `<h2 id="notes-heading">Notes (${notes.length})</h2>${notes.map(item).join("")}` : "";
     sections.push(["problems", `Problems (${bad.length})`], ["picture-section", "Topology"]);
     const odd = hosts.filter(({ report: { log } }) => log.unknown.count || log.leftoverTexts || log.runs !== 1 || log.cutInLine)
       .map(({ name, report: { log } }) => `<div class="note"><b>${esc(log.name)}</b> <span class="faint">${esc(name)}</span><br>` +
@@ -271,7 +273,6 @@
           .filter(Boolean).join("; ") + "</div>");
     return `<h2 id="problems-heading">Problems (${bad.length})</h2>` +
       (bad.map(item).join("") || "<p>None.</p>") +
-      (notes.length ? `<h2>Notes (${notes.length})</h2>${notes.map(item).join("")}` : "") +
       (odd.length ? `<h2>The log itself</h2>${odd.join("")}` : "");
   }
 
@@ -372,6 +373,9 @@
   byId("problems").innerHTML = problemsHtml();
   draw();
   byId("tables").innerHTML = tablesHtml();
+  if (byId("notes").hasChildNodes()) {
+    sections.push(["notes", byId("notes-heading").textContent]);
+  }
   document.querySelector("nav").innerHTML = sections.map(([id, title]) => `<a href="#${id}">${esc(title)}</a>`).join("");
 
   const input = byId("search");

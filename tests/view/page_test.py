@@ -64,6 +64,7 @@ class Page(unittest.TestCase):
             field.send_keys(lun["identifier"] + "\n")
             self.assertEqual(self.count("#paths tr.hit"), lun["pathCount"])
             self.assertEqual(self.count("#picture .lun.hit"), 1)
+            self.assertEqual(self.browser.find_element("css selector", "#picture .lun.hit").value_of_css_property("opacity"), "1")
             self.assertEqual(self.count("#picture .target.hit"), lun["pathCount"])
             self.assertEqual(self.browser.get_log("browser"), [])
 
