@@ -1,10 +1,10 @@
 #include "simhost/adapter_writer.hpp"
 
-#include "simhost/adapter_file.hpp"
-
 #include <algorithm>
 #include <bit>
 #include <cstring>
+
+#include "simhost/adapter_file.hpp"
 
 namespace simhost {
 namespace {

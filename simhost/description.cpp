@@ -1,10 +1,10 @@
 #include "simhost/description.hpp"
 
-#include "simhost/toml_reader.hpp"
-
 #include <algorithm>
 #include <charconv>
 #include <cstring>
+
+#include "simhost/toml_reader.hpp"
 
 namespace simhost {
 namespace {

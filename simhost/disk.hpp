@@ -1,11 +1,11 @@
 // A simulated disk's side of one SCSI command.
 #pragma once
 
-#include "simhost/description.hpp"
-
 #include <cstdint>
 #include <map>
 #include <span>
+
+#include "simhost/description.hpp"
 
 namespace simhost {
 

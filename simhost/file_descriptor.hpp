@@ -1,10 +1,11 @@
 // Owned file descriptors, and system calls whose failure is an exception.
 #pragma once
 
+#include <unistd.h>
+
 #include <cerrno>
 #include <string>
 #include <system_error>
-#include <unistd.h>
 #include <utility>
 
 namespace simhost {

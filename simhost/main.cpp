@@ -1,25 +1,26 @@
 // simhost HOST.toml [--record FILE] [--keep DIR] -- PROGRAM [ARGUMENT...]
 // Runs a program on a simulated host; README.md says how.
+#include <fcntl.h>
+#include <sched.h>
+#include <sys/prctl.h>
+#include <sys/syscall.h>
+#include <sys/wait.h>
+
+#include <chrono>
+#include <csignal>
+#include <cstring>
+#include <filesystem>
+#include <iostream>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <thread>
+
 #include "simhost/description.hpp"
 #include "simhost/file_descriptor.hpp"
 #include "simhost/record.hpp"
 #include "simhost/supervisor.hpp"
 #include "simhost/world.hpp"
-
-#include <chrono>
-#include <csignal>
-#include <cstring>
-#include <fcntl.h>
-#include <filesystem>
-#include <iostream>
-#include <optional>
-#include <sched.h>
-#include <string>
-#include <string_view>
-#include <sys/prctl.h>
-#include <sys/syscall.h>
-#include <sys/wait.h>
-#include <thread>
 
 namespace simhost {
 namespace {

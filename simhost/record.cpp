@@ -1,6 +1,7 @@
 #include "simhost/record.hpp"
 
 #include <fcntl.h>
+
 #include <string_view>
 
 namespace simhost {

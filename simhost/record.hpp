@@ -1,13 +1,13 @@
 // The record of what the program asked of the simulated host; README.md gives its lines.
 #pragma once
 
-#include "simhost/file_descriptor.hpp"
-#include "simhost/sg_header.hpp"
-
 #include <cstdint>
 #include <filesystem>
 #include <span>
 #include <string>
+
+#include "simhost/file_descriptor.hpp"
+#include "simhost/sg_header.hpp"
 
 namespace simhost {
 

@@ -1,8 +1,9 @@
 #include "simhost/sg_header.hpp"
 
+#include <sys/uio.h>
+
 #include <bit>
 #include <cstddef>
-#include <sys/uio.h>
 
 namespace simhost {
 namespace {

@@ -2,9 +2,10 @@
 // which may have the other word size.
 #pragma once
 
+#include <sys/types.h>
+
 #include <cstdint>
 #include <optional>
-#include <sys/types.h>
 
 namespace simhost {
 

@@ -1,10 +1,5 @@
 #include "simhost/supervisor.hpp"
 
-#include "simhost/sg_header.hpp"
-
-#include <array>
-#include <bit>
-#include <cstddef>
 #include <linux/audit.h>
 #include <linux/filter.h>
 #include <linux/seccomp.h>
@@ -14,6 +9,12 @@
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <sys/uio.h>
+
+#include <array>
+#include <bit>
+#include <cstddef>
+
+#include "simhost/sg_header.hpp"
 
 #ifndef SECCOMP_IOCTL_NOTIF_SET_FLAGS // Linux 6.6
 #define SECCOMP_IOCTL_NOTIF_SET_FLAGS SECCOMP_IOW(4, __u64)

@@ -12,13 +12,14 @@
 // holds for every process that the program starts, and the kernel drops it with them.
 #pragma once
 
+#include <sys/types.h>
+
+#include <unordered_map>
+#include <vector>
+
 #include "simhost/disk.hpp"
 #include "simhost/file_descriptor.hpp"
 #include "simhost/record.hpp"
-
-#include <sys/types.h>
-#include <unordered_map>
-#include <vector>
 
 struct seccomp_notif;
 

@@ -2,15 +2,16 @@
 // so that a misspelt key cannot pass for an absent one.
 #pragma once
 
-#include "simhost/description.hpp"
-
 #include <cstdint>
 #include <optional>
 #include <set>
 #include <string>
 #include <string_view>
-#include <toml++/toml.h>
 #include <vector>
+
+#include <toml++/toml.h>
+
+#include "simhost/description.hpp"
 
 namespace simhost {
 

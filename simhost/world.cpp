@@ -1,18 +1,19 @@
 #include "simhost/world.hpp"
 
-#include "simhost/adapter_file.hpp"
-#include "simhost/adapter_writer.hpp"
-#include "simhost/file_descriptor.hpp"
-
-#include <algorithm>
 #include <fcntl.h>
-#include <fstream>
-#include <map>
 #include <sys/mount.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/syscall.h>
 #include <sys/un.h>
+
+#include <algorithm>
+#include <fstream>
+#include <map>
+
+#include "simhost/adapter_file.hpp"
+#include "simhost/adapter_writer.hpp"
+#include "simhost/file_descriptor.hpp"
 
 namespace simhost {
 namespace {

@@ -1,10 +1,10 @@
 // The file system of a simulated host: the real machine's, with what the description speaks of replaced.
 #pragma once
 
-#include "simhost/description.hpp"
-
 #include <filesystem>
 #include <string>
+
+#include "simhost/description.hpp"
 
 namespace simhost {
 

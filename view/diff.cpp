@@ -1,8 +1,5 @@
 #include "view/diff.hpp"
 
-#include "view/escape.hpp"
-#include "view/words.hpp"
-
 #include <algorithm>
 #include <iterator>
 #include <map>
@@ -11,6 +8,9 @@
 #include <unordered_map>
 #include <unordered_set>
 #include <utility>
+
+#include "view/escape.hpp"
+#include "view/words.hpp"
 
 namespace view {
 

@@ -1,16 +1,16 @@
 #pragma once
 
-#include "view/model.hpp"
-#include "view/path_view.hpp"
-#include "view/text_layout.hpp"
-
-#include <nlohmann/json.hpp>
-
 #include <cstddef>
 #include <optional>
 #include <ostream>
 #include <string>
 #include <vector>
+
+#include <nlohmann/json.hpp>
+
+#include "view/model.hpp"
+#include "view/path_view.hpp"
+#include "view/text_layout.hpp"
 
 namespace view {
 

@@ -1,9 +1,9 @@
 #pragma once
 
-#include <nlohmann/json.hpp>
-
 #include <ostream>
 #include <string>
+
+#include <nlohmann/json.hpp>
 
 namespace view {
 

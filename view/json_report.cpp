@@ -1,10 +1,10 @@
 #include "view/json_report.hpp"
 
-#include "view/escape.hpp"
-#include "view/words.hpp"
-
 #include <string>
 #include <vector>
+
+#include "view/escape.hpp"
+#include "view/words.hpp"
 
 namespace view {
 

@@ -1,8 +1,8 @@
 #pragma once
 
-#include "view/model.hpp"
-
 #include <nlohmann/json.hpp>
+
+#include "view/model.hpp"
 
 namespace view {
 

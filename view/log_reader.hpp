@@ -1,14 +1,14 @@
 #pragma once
 
-#include "view/model.hpp"
-#include "view/model_builder.hpp"
-#include "view/text_matcher.hpp"
-
 #include <cstddef>
 #include <cstdint>
 #include <istream>
 #include <string>
 #include <string_view>
+
+#include "view/model.hpp"
+#include "view/model_builder.hpp"
+#include "view/text_matcher.hpp"
 
 namespace view {
 

@@ -1,8 +1,8 @@
 #pragma once
 
-#include "view/model.hpp"
-
 #include <string_view>
+
+#include "view/model.hpp"
 
 namespace view {
 

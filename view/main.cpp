@@ -1,13 +1,3 @@
-#include "view/diff.hpp"
-#include "view/escape.hpp"
-#include "view/html_page.hpp"
-#include "view/json_report.hpp"
-#include "view/log_reader.hpp"
-#include "view/san.hpp"
-#include "view/text_report.hpp"
-
-#include <CLI/CLI.hpp>
-#include <nlohmann/json.hpp>
 #include <unistd.h>
 
 #include <cerrno>
@@ -21,6 +11,17 @@
 #include <string>
 #include <system_error>
 #include <vector>
+
+#include <CLI/CLI.hpp>
+#include <nlohmann/json.hpp>
+
+#include "view/diff.hpp"
+#include "view/escape.hpp"
+#include "view/html_page.hpp"
+#include "view/json_report.hpp"
+#include "view/log_reader.hpp"
+#include "view/san.hpp"
+#include "view/text_report.hpp"
 
 namespace {
 

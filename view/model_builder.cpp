@@ -1,10 +1,10 @@
 #include "view/model_builder.hpp"
 
-#include "view/words.hpp"
-
 #include <charconv>
 #include <limits>
 #include <system_error>
+
+#include "view/words.hpp"
 
 namespace view {
 

@@ -1,8 +1,5 @@
 #pragma once
 
-#include "view/model.hpp"
-#include "view/text_matcher.hpp"
-
 #include <cstdint>
 #include <map>
 #include <set>
@@ -11,6 +8,9 @@
 #include <unordered_set>
 #include <utility>
 #include <vector>
+
+#include "view/model.hpp"
+#include "view/text_matcher.hpp"
 
 namespace view {
 

@@ -1,8 +1,8 @@
 #pragma once
 
-#include "view/model.hpp"
-
 #include <string>
+
+#include "view/model.hpp"
 
 namespace view {
 

@@ -1,12 +1,12 @@
 #include "view/san.hpp"
 
-#include "view/escape.hpp"
-#include "view/words.hpp"
-
 #include <algorithm>
 #include <map>
 #include <set>
 #include <string_view>
+
+#include "view/escape.hpp"
+#include "view/words.hpp"
 
 namespace view {
 

@@ -1,15 +1,15 @@
 #pragma once
 
-#include "view/model.hpp"
-#include "view/text_layout.hpp"
-
-#include <nlohmann/json.hpp>
-
 #include <cstddef>
 #include <ostream>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include <nlohmann/json.hpp>
+
+#include "view/model.hpp"
+#include "view/text_layout.hpp"
 
 namespace view {
 

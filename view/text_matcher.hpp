@@ -1,12 +1,12 @@
 #pragma once
 
-#include "view/known_texts.hpp"
-
 #include <array>
 #include <cstddef>
 #include <span>
 #include <string_view>
 #include <vector>
+
+#include "view/known_texts.hpp"
 
 namespace view {
 

@@ -1,9 +1,5 @@
 #include "view/text_report.hpp"
 
-#include "view/escape.hpp"
-#include "view/path_view.hpp"
-#include "view/words.hpp"
-
 #include <algorithm>
 #include <cstddef>
 #include <iomanip>
@@ -11,6 +7,10 @@
 #include <sstream>
 #include <string_view>
 #include <utility>
+
+#include "view/escape.hpp"
+#include "view/path_view.hpp"
+#include "view/words.hpp"
 
 namespace view {
 

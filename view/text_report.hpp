@@ -1,11 +1,11 @@
 #pragma once
 
-#include "view/model.hpp"
-#include "view/text_layout.hpp"
-
 #include <ostream>
 #include <string>
 #include <vector>
+
+#include "view/model.hpp"
+#include "view/text_layout.hpp"
 
 namespace view {
 

@@ -1,10 +1,10 @@
 #pragma once
 
-#include "view/model.hpp"
-
 #include <cstdint>
 #include <string>
 #include <string_view>
+
+#include "view/model.hpp"
 
 namespace view {
 

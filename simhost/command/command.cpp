@@ -1,13 +1,14 @@
 // Stands in a simulated host for iscsiadm, pgrep and powermt: prints what the description gives for this call
 // of the command that it was called as, and ends with the described status. Linked statically and written on
 // the bare system calls: a host's commands start as fast as they can.
+#include <fcntl.h>
+#include <sys/file.h>
+#include <unistd.h>
+
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <fcntl.h>
 #include <string>
-#include <sys/file.h>
-#include <unistd.h>
 
 namespace {
 

@@ -1,17 +1,19 @@
 // The simulated HBA vendor library. The HBA API library loads it as it loads a real vendor's, by
 // /etc/hba.conf; its adapters come from the file that simhost wrote. It keeps no copy of them: the file is
 // mapped, privately writable so that calls can be counted in place.
-#include "simhost/adapter_file.hpp"
-
-#include <algorithm>
-#include <cstring>
-#include <ctime> // hbaapi.h needs it
 #include <fcntl.h>
-#include <hbaapi.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
 #include <unistd.h>
 #include <vendorhbaapi.h>
+
+#include <algorithm>
+#include <cstring>
+#include <ctime> // hbaapi.h needs it
+
+#include <hbaapi.h>
+
+#include "simhost/adapter_file.hpp"
 
 namespace {
 

@@ -1,8 +1,8 @@
 // The pieces that a run is made of: a trace line, a page's designators, a look into the register of devices.
-#include <benchmark/benchmark.h>
-
 #include <cstdio>
 #include <string>
+
+#include <benchmark/benchmark.h>
 
 #include "foundation/trace.hpp"
 #include "main/device_register.hpp"

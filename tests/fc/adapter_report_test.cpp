@@ -1,9 +1,9 @@
 #include "fc/adapter_report.hpp"
 
-#include <gtest/gtest.h>
-
 #include <memory>
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/support/fake_hba.hpp"

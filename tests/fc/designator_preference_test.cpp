@@ -1,9 +1,9 @@
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <array>
 #include <iterator>
 #include <numeric>
+
+#include <gtest/gtest.h>
 
 #include "fc/unique_lun_id.hpp"
 #include "main/run_state.hpp"

@@ -1,9 +1,9 @@
 #include "fc/hba_access.hpp"
 
-#include <gtest/gtest.h>
-
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/support/fake_hba.hpp"

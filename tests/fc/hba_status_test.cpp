@@ -1,8 +1,8 @@
 #include "fc/hba_status.hpp"
 
-#include <gtest/gtest.h>
-
 #include <string>
+
+#include <gtest/gtest.h>
 
 namespace {
 

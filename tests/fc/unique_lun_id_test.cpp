@@ -1,8 +1,8 @@
 #include "fc/unique_lun_id.hpp"
 
-#include <gtest/gtest.h>
-
 #include <cerrno>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "main/run_state.hpp"

@@ -1,6 +1,6 @@
-#include <gtest/gtest.h>
-
 #include <cstdio>
+
+#include <gtest/gtest.h>
 
 #include "foundation/trace.hpp"
 #include "tests/support/fatal.hpp"

@@ -1,12 +1,13 @@
 #include "foundation/buffer.hpp"
 
-#include <gtest/gtest.h>
 #include <sys/resource.h>
 
 #include <cstddef>
 #include <cstring>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/support/fatal.hpp"

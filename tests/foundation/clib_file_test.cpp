@@ -1,12 +1,13 @@
 #include "foundation/clib_file.hpp"
 
 #include <fcntl.h>
-#include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/support/temporary_directory.hpp"

@@ -1,11 +1,11 @@
 #include "foundation/clib_memory.hpp"
 
-#include <gtest/gtest.h>
-
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "foundation/clib_error.hpp"
 #include "foundation/exceptions.hpp"

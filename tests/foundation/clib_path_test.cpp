@@ -1,6 +1,5 @@
 #include "foundation/clib_path.hpp"
 
-#include <gtest/gtest.h>
 #include <sys/time.h>
 #include <unistd.h>
 
@@ -12,6 +11,8 @@
 #include <filesystem>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/foundation/failing_calls.hpp"

@@ -1,13 +1,14 @@
 #include "foundation/clib_stream.hpp"
 
 #include <fcntl.h>
-#include <gtest/gtest.h>
 #include <unistd.h>
 
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/support/temporary_directory.hpp"

@@ -1,12 +1,13 @@
 #include "foundation/clib_time.hpp"
 
-#include <gtest/gtest.h>
 #include <sys/time.h>
 
 #include <cerrno>
 #include <csignal>
 #include <cstdlib>
 #include <ctime>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/foundation/failing_calls.hpp"

@@ -1,11 +1,11 @@
 #include "foundation/counted_pointer.hpp"
 
-#include <gtest/gtest.h>
-
 #include <cstring>
 #include <new>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/foundation/failing_calls.hpp"

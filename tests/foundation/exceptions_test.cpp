@@ -1,10 +1,10 @@
 #include "foundation/exceptions.hpp"
 
-#include <gtest/gtest.h>
-
 #include <exception>
 #include <type_traits>
 #include <typeinfo>
+
+#include <gtest/gtest.h>
 
 namespace {
 

@@ -1,8 +1,8 @@
 #include "foundation/list.hpp"
 
-#include <gtest/gtest.h>
-
 #include <new>
+
+#include <gtest/gtest.h>
 
 #include "foundation/counted_pointer.hpp"
 #include "foundation/exceptions.hpp"

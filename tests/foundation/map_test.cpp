@@ -1,10 +1,10 @@
 #include "foundation/map.hpp"
 
-#include <gtest/gtest.h>
-
 #include <iterator>
 #include <new>
 #include <stdexcept>
+
+#include <gtest/gtest.h>
 
 #include "foundation/counted_pointer.hpp"
 #include "foundation/exceptions.hpp"

@@ -1,8 +1,8 @@
 #include "foundation/trace.hpp"
 
-#include <gtest/gtest.h>
-
 #include <cstdio>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/support/log_capture.hpp"

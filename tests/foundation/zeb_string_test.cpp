@@ -1,10 +1,10 @@
 #include "foundation/zeb_string.hpp"
 
-#include <gtest/gtest.h>
-
 #include <map>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/foundation/failing_calls.hpp"

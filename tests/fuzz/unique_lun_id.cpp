@@ -2,6 +2,7 @@
 // it likes. The input is the request flag's byte (modulo 3: FC, DAS, iSCSI) and the answers, command by
 // command, as scripted_device.hpp has them.
 #include "fc/unique_lun_id.hpp"
+
 #include "main/run_state.hpp"
 #include "tests/fuzz/scripted_device.hpp"
 

@@ -1,10 +1,10 @@
 #include "host/das_tree.hpp"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "main/device_register.hpp"

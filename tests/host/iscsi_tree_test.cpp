@@ -1,9 +1,9 @@
 #include "host/iscsi_tree.hpp"
 
-#include <gtest/gtest.h>
-
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "main/device_register.hpp"

@@ -1,8 +1,8 @@
 #include "host/logical_tree.hpp"
 
-#include <gtest/gtest.h>
-
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "main/device_register.hpp"

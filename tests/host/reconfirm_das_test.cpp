@@ -1,8 +1,8 @@
 #include "host/reconfirm_das.hpp"
 
-#include <gtest/gtest.h>
-
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "tests/host/host_files.hpp"
 #include "tests/support/log_capture.hpp"

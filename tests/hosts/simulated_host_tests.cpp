@@ -6,16 +6,17 @@
 //   expected.output, expected.error, expected.status
 // With MORVANE_ACCEPT set in the environment the files are written instead of compared; review the
 // difference.
-#include "tests/hosts/log_comparison.hpp"
-#include "tests/support/process.hpp"
-
 #include <algorithm>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
-#include <gtest/gtest.h>
 #include <map>
 #include <sstream>
+
+#include <gtest/gtest.h>
+
+#include "tests/hosts/log_comparison.hpp"
+#include "tests/support/process.hpp"
 
 namespace test {
 namespace {

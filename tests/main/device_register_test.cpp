@@ -1,8 +1,8 @@
 #include "main/device_register.hpp"
 
-#include <gtest/gtest.h>
-
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/support/log_capture.hpp"

@@ -1,10 +1,10 @@
 #include "main/device_report.hpp"
 
-#include <gtest/gtest.h>
-
 #include <new>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "main/device_register.hpp"

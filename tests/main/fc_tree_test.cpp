@@ -1,9 +1,9 @@
 #include "main/fc_tree.hpp"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "fc/tree_build.hpp"
 #include "foundation/exceptions.hpp"

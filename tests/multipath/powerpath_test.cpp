@@ -1,10 +1,11 @@
 #include "multipath/powerpath.hpp"
 
-#include <gtest/gtest.h>
 #include <unistd.h>
 
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "tests/support/fake_commands.hpp"

@@ -1,6 +1,6 @@
-#include <gtest/gtest.h>
-
 #include <optional>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "scsi/scsi_exceptions.hpp"

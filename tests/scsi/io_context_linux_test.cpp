@@ -1,8 +1,8 @@
 #include "scsi/io_context_linux.hpp"
 
-#include <gtest/gtest.h>
-
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "scsi/scsi_exceptions.hpp"

@@ -1,12 +1,13 @@
 #include "scsi/io_handler_linux.hpp"
 
 #include <fcntl.h>
-#include <gtest/gtest.h>
 #include <scsi/sg.h>
 
 #include <cerrno>
 #include <optional>
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "scsi/io_context_linux.hpp"
 #include "scsi/scsi_exceptions.hpp"

@@ -1,6 +1,6 @@
-#include <gtest/gtest.h>
-
 #include <cerrno>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "scsi/io_context_linux.hpp"

@@ -3,8 +3,9 @@
 #include <cstdlib>
 #include <cstring>
 #include <ctime> // hbaapi.h needs it
-#include <hbaapi.h>
 #include <memory>
+
+#include <hbaapi.h>
 
 namespace {
 

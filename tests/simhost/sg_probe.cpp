@@ -1,14 +1,15 @@
 // Sends SCSI commands to the named nodes and prints, a line each, what came back. Built for both word sizes.
 // Usage: sg_probe NODE CDB [NODE CDB ...], each CDB in hex.
+#include <fcntl.h>
+#include <scsi/sg.h>
+#include <sys/ioctl.h>
+#include <unistd.h>
+
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <fcntl.h>
-#include <scsi/sg.h>
 #include <string>
-#include <sys/ioctl.h>
-#include <unistd.h>
 
 namespace {
 

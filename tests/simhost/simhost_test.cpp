@@ -1,10 +1,12 @@
-#include "tests/support/process.hpp"
+#include <unistd.h>
 
 #include <chrono>
 #include <filesystem>
 #include <fstream>
+
 #include <gtest/gtest.h>
-#include <unistd.h>
+
+#include "tests/support/process.hpp"
 
 namespace test {
 namespace {

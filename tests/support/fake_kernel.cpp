@@ -1,13 +1,14 @@
 #include "tests/support/fake_kernel.hpp"
 
 #include <fcntl.h>
-#include <gtest/gtest.h>
 #include <scsi/sg.h>
 #include <sys/timeb.h>
 
 #include <algorithm>
 #include <cerrno>
 #include <cstdarg>
+
+#include <gtest/gtest.h>
 
 namespace {
 

@@ -1,10 +1,10 @@
 // Preconditions whose breach ends the process.
 #pragma once
 
+#include <string>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-
-#include <string>
 
 #include "tests/support/log_capture.hpp"
 

@@ -1,9 +1,9 @@
 // An INQUIRY object, the handler that it uses and the kernel behind them.
 #pragma once
 
-#include <gtest/gtest.h>
-
 #include <string>
+
+#include <gtest/gtest.h>
 
 #include "scsi/inquiry.hpp"
 #include "scsi/io_handler_linux.hpp"

@@ -1,15 +1,16 @@
 #include "tests/support/process.hpp"
 
+#include <fcntl.h>
+#include <sys/prctl.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
 #include <cerrno>
 #include <csignal>
 #include <cstdlib>
-#include <fcntl.h>
 #include <fstream>
 #include <sstream>
-#include <sys/prctl.h>
-#include <sys/wait.h>
 #include <system_error>
-#include <unistd.h>
 
 namespace test {
 namespace {

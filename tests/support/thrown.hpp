@@ -1,11 +1,11 @@
 // What an action throws.
 #pragma once
 
-#include <gtest/gtest.h>
-
 #include <exception>
 #include <string>
 #include <typeinfo>
+
+#include <gtest/gtest.h>
 
 // The text of the exception that `action` throws. It must be an `Exception` and no subclass of it.
 template <typename Exception, typename Action>

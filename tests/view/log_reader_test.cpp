@@ -1,12 +1,12 @@
 #include "view/log_reader.hpp"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <sstream>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "tests/view/reading.hpp"
 

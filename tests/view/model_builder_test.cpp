@@ -1,9 +1,9 @@
 #include "view/model_builder.hpp"
 
-#include <gtest/gtest.h>
-
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "tests/view/reading.hpp"
 

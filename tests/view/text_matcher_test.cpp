@@ -1,10 +1,10 @@
 #include "view/text_matcher.hpp"
 
-#include <gtest/gtest.h>
-
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 namespace {
 

@@ -1,9 +1,9 @@
 #include "view/text_report.hpp"
 
-#include <gtest/gtest.h>
-
 #include <sstream>
 #include <string>
+
+#include <gtest/gtest.h>
 
 namespace {
 

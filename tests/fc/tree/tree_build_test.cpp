@@ -1,11 +1,11 @@
 #include "fc/tree_build.hpp"
 
-#include <gtest/gtest.h>
-
 #include <deque>
 #include <memory>
 #include <string>
 #include <vector>
+
+#include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
 #include "main/device_register.hpp"
