@@ -5,13 +5,13 @@
 #include <sys/mman.h>
 #include <sys/stat.h>
 #include <unistd.h>
-#include <vendorhbaapi.h>
 
 #include <algorithm>
 #include <cstring>
 #include <ctime> // hbaapi.h needs it
 
 #include <hbaapi.h>
+#include <vendorhbaapi.h>
 
 #include "simhost/adapter_file.hpp"
 
