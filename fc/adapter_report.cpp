@@ -32,7 +32,7 @@ void printLun(const HBA_FCPSCSIENTRYV2& entry, std::FILE* stream) {
 
 void HA_PrintAdapterTree(const HBA_ADAPTERATTRIBUTES& adapter, const PortAttributes& ports,
                          const HBA_FCPTARGETMAPPINGV2& mapping, std::FILE* stream) {
-    TRACE_ENTRY("HA_PrintAdapterTree");
+    const FunctionTrace trace("HA_PrintAdapterTree");
     Clib_fprintf(stream, "\n");
     Clib_fprintf(stream, "|_ Adapter wwnn ");
     Clib_fprintf(stream, "%s", WwnText(adapter.NodeWWN).text);
@@ -48,5 +48,5 @@ void HA_PrintAdapterTree(const HBA_ADAPTERATTRIBUTES& adapter, const PortAttribu
             printLun(mapping.entry[index], stream);
         }
     }
-    TRACE_EXIT("HA_PrintAdapterTree");
+    trace.exit();
 }

@@ -7,23 +7,12 @@
 
 #include "fc/hba_status.hpp"
 #include "foundation/exceptions.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
 
 namespace {
 
 constexpr std::size_t kAdapterNameSize = 256;
-
-// Logs nothing: `message` is the exception's.
-[[noreturn]] void leaveWithHbaapiEx(const char* caller, const char* message) {
-    TRACE_EXIT(caller);
-    throw THbaapiEx(message);
-}
-
-[[noreturn]] void leaveWithHaltEx(const char* caller, const char* logLine, const char* message) {
-    logPrintf("%s", logLine);
-    TRACE_EXIT(caller);
-    throw THaltEx(message);
-}
 
 // A zeroed block of `size` bytes; null when there is no memory, and for size 0.
 MappingBlock<HBA_FCPTARGETMAPPING> allocateMapping(std::size_t size) {
@@ -52,15 +41,15 @@ PortAttributes::PortAttributes(uint32 count) : mCount(count) {
     // Pointers count as the 32-bit program's, for the same line between possible and not in both builds.
     constexpr uint32 kMostPointers = 0x7FFFFFFF / 4;
     if (count <= kMostPointers) {
-        mpRecords = new (std::nothrow) HBA_PORTATTRIBUTES*[count];
+        mRecords = new (std::nothrow) HBA_PORTATTRIBUTES*[count];
     }
 }
 
 PortAttributes::~PortAttributes() {
     for (uint32 i = 0; i < mMade; ++i) {
-        delete mpRecords[i];
+        delete mRecords[i];
     }
-    delete[] mpRecords;
+    delete[] mRecords;
 }
 
 bool PortAttributes::allocateRecords() {
@@ -69,8 +58,8 @@ bool PortAttributes::allocateRecords() {
         return false;
     }
     for (; mMade < mCount; ++mMade) {
-        mpRecords[mMade] = new (std::nothrow) HBA_PORTATTRIBUTES();
-        if (mpRecords[mMade] == nullptr) {
+        mRecords[mMade] = new (std::nothrow) HBA_PORTATTRIBUTES();
+        if (mRecords[mMade] == nullptr) {
             return false;
         }
     }
@@ -78,33 +67,33 @@ bool PortAttributes::allocateRecords() {
 }
 
 void HA_LoadHbaapi() {
-    TRACE_ENTRY("HA_LoadHbaapi");
+    const FunctionTrace trace("HA_LoadHbaapi");
     logPrintf("Going to open HBAAPI library\n");
     const HBA_STATUS status = HBA_LoadLibrary();
     if (status != HBA_STATUS_OK) {
         logPrintf("Failed to load HBAAPI library : %s\n", hbaStatusName(status));
-        leaveWithHbaapiEx("HA_LoadHbaapi", "HBA_LoadLibrary failed");
+        trace.fail<THbaapiEx>("HBA_LoadLibrary failed");
     }
-    TRACE_EXIT("HA_LoadHbaapi");
+    trace.exit();
 }
 
 void HA_FreeHbaapi() {
-    TRACE_ENTRY("HA_FreeHbaapi");
+    const FunctionTrace trace("HA_FreeHbaapi");
     logPrintf("Going to free the HBAAPI library\n");
     static_cast<void>(HBA_FreeLibrary());
     logPrintf("Freed HBAAPI library\n");
-    TRACE_EXIT("HA_FreeHbaapi");
+    trace.exit();
 }
 
 uint32 HA_GetNumberOfAdapters() {
-    TRACE_ENTRY("HA_GetNumberOfAdapters");
+    const FunctionTrace trace("HA_GetNumberOfAdapters");
     const uint32 count = HBA_GetNumberOfAdapters();
-    TRACE_EXIT("HA_GetNumberOfAdapters");
+    trace.exit();
     return count;
 }
 
 void HA_GetAdapterNames(uint32 count, std::vector<ZebString>& names) {
-    TRACE_ENTRY("HA_GetAdapterNames");
+    const FunctionTrace trace("HA_GetAdapterNames");
     for (uint32 index = 0; index < count; ++index) {
         char name[kAdapterNameSize + 1] = {}; // ends even a name that fills its field
         logPrintf("Going to get adapter name, # = <%d>\n", static_cast<int32>(index));
@@ -112,94 +101,92 @@ void HA_GetAdapterNames(uint32 count, std::vector<ZebString>& names) {
         if (status != HBA_STATUS_OK) {
             logPrintf("Failed to get adapter #%d name - %s\n", static_cast<int32>(index),
                       hbaStatusName(status));
-            leaveWithHbaapiEx("HA_GetAdapterNames", "HBA_GetAdapterName method failed\n");
+            trace.fail<THbaapiEx>("HBA_GetAdapterName method failed\n");
         }
         name[kAdapterNameSize] = '\0';
         logPrintf("Adapter name: %s\n", name);
         names[index] = name;
     }
-    TRACE_EXIT("HA_GetAdapterNames");
+    trace.exit();
 }
 
 HBA_HANDLE HA_OpenAdapter(char* name) {
-    TRACE_ENTRY("HA_OpenAdapter");
+    const FunctionTrace trace("HA_OpenAdapter");
     logPrintf("Going to open adapter, adapter name = <%s>\n", name);
     const HBA_HANDLE handle = HBA_OpenAdapter(name);
     if (handle == 0) {
         logPrintf("Failed to open adapter, adapter name = <%s>\n", name);
-        leaveWithHbaapiEx("HA_OpenAdapter", "HBA_OpenAdapter method failed\n");
+        trace.fail<THbaapiEx>("HBA_OpenAdapter method failed\n");
     }
-    TRACE_EXIT("HA_OpenAdapter");
+    trace.exit();
     return handle;
 }
 
 void HA_CloseAdapter(HBA_HANDLE handle) {
-    TRACE_ENTRY("HA_CloseAdapter");
+    const FunctionTrace trace("HA_CloseAdapter");
     logPrintf("Going to close adapter...\n");
     HBA_CloseAdapter(handle);
     logPrintf("Closed adapter\n");
-    TRACE_EXIT("HA_CloseAdapter");
+    trace.exit();
 }
 
 std::unique_ptr<HBA_ADAPTERATTRIBUTES> HA_GetAdapterAttributes(HBA_HANDLE handle) {
-    TRACE_ENTRY("HA_GetAdapterAttributes");
+    const FunctionTrace trace("HA_GetAdapterAttributes");
     std::unique_ptr<HBA_ADAPTERATTRIBUTES> attributes(new (std::nothrow) HBA_ADAPTERATTRIBUTES());
     if (!attributes) {
-        leaveWithHaltEx("HA_GetAdapterAttributes", "Failed to allocate adapter attributes\n",
-                        "No memory for adapter attributes\n");
+        trace.logAndFail<THaltEx>("Failed to allocate adapter attributes\n",
+                                  "No memory for adapter attributes\n");
     }
     logPrintf("Going to get adapter attributes\n");
     const HBA_STATUS status = HBA_GetAdapterAttributes(handle, attributes.get());
     if (status == HBA_STATUS_ERROR_NOT_SUPPORTED) {
         logPrintf("Encountered non-supported Adapter - %s\n", hbaStatusName(status));
-        TRACE_EXIT("HA_GetAdapterAttributes");
+        trace.exit();
         return nullptr;
     }
     if (status != HBA_STATUS_OK) {
         logPrintf("Failed to get adapter attributes - %s\n", hbaStatusName(status));
-        leaveWithHbaapiEx("HA_GetAdapterAttributes", "HBA_GetAdapterAttributes method failed\n");
+        trace.fail<THbaapiEx>("HBA_GetAdapterAttributes method failed\n");
     }
     if (attributes->NumberOfPorts == 0) {
-        leaveWithHaltEx("HA_GetAdapterAttributes", "No ports on the adapter\n",
-                        "ZERO Ports on the Adapter\n");
+        trace.logAndFail<THaltEx>("No ports on the adapter\n", "ZERO Ports on the Adapter\n");
     }
     logPrintf("Adapter info: Manufacturer %.64s Model %.256s NumPorts=%d\n", attributes->Manufacturer,
               attributes->Model, static_cast<int32>(attributes->NumberOfPorts));
-    TRACE_EXIT("HA_GetAdapterAttributes");
+    trace.exit();
     return attributes;
 }
 
 std::unique_ptr<PortAttributes> HA_GetAdapterPorts(HBA_HANDLE handle, const HBA_ADAPTERATTRIBUTES& adapter) {
-    TRACE_ENTRY("HA_GetAdapterPorts");
+    const FunctionTrace trace("HA_GetAdapterPorts");
     std::unique_ptr<PortAttributes> ports(new (std::nothrow) PortAttributes(adapter.NumberOfPorts));
     if (!ports || !ports->hasRoom()) {
-        leaveWithHaltEx("HA_GetAdapterPorts", "Failed to allocate port attributes ptr array\n",
-                        "No memory for Port Attributes\n");
+        trace.logAndFail<THaltEx>("Failed to allocate port attributes ptr array\n",
+                                  "No memory for Port Attributes\n");
     }
     if (!ports->allocateRecords()) {
-        leaveWithHaltEx("HA_GetAdapterPorts", "Failed to allocate port attributes\n",
-                        "No memory for Port Attributes\n");
+        trace.logAndFail<THaltEx>("Failed to allocate port attributes\n", "No memory for Port Attributes\n");
     }
     for (uint32 index = 0; index < ports->count(); ++index) {
         logPrintf("Going to get port attributes\n");
         const HBA_STATUS status = HBA_GetAdapterPortAttributes(handle, index, &(*ports)[index]);
         if (status != HBA_STATUS_OK) {
             logPrintf("Failed to get port attributes - %s\n", hbaStatusName(status));
-            leaveWithHbaapiEx("HA_GetAdapterPorts", "HBA_GetAdapterPortAttributes method failed\n");
+            trace.fail<THbaapiEx>("HBA_GetAdapterPortAttributes method failed\n");
         }
     }
-    TRACE_EXIT("HA_GetAdapterPorts");
+    trace.exit();
     return ports;
 }
 
 MappingBlock<HBA_FCPTARGETMAPPING> HA_GetTargetMappings(HBA_HANDLE handle) {
-    TRACE_ENTRY("HA_GetTargetMappings");
+    const FunctionTrace trace("HA_GetTargetMappings");
     logPrintf("Allocating memory for single target mapping\n");
     uint32 room = 1;
     auto mapping = allocateMapping(mappingBlockSize<HBA_FCPTARGETMAPPING, HBA_FCPSCSIENTRY>(room));
     if (!mapping) {
-        leaveWithHaltEx("HA_GetTargetMappings", "Failed to allocate memory for target mappings\n",
-                        "No memory for target mapping\n");
+        trace.logAndFail<THaltEx>("Failed to allocate memory for target mappings\n",
+                                  "No memory for target mapping\n");
     }
     mapping->NumberOfEntries = 1;
     logPrintf("Going to invoke HBA_GetFcpTargetMapping to get target mappings\n");
@@ -209,7 +196,7 @@ MappingBlock<HBA_FCPTARGETMAPPING> HA_GetTargetMappings(HBA_HANDLE handle) {
     logPrintf("The number of targets is %u\n", count);
     if (status != HBA_STATUS_OK && status != HBA_STATUS_ERROR_MORE_DATA) {
         logPrintf("Failed to get target mappings - %s\n", hbaStatusName(status));
-        leaveWithHbaapiEx("HA_GetTargetMappings", "HBA_GetFcpTargetMapping method failed\n");
+        trace.fail<THbaapiEx>("HBA_GetFcpTargetMapping method failed\n");
     }
     if (status == HBA_STATUS_ERROR_MORE_DATA && count > 1) {
         mapping.reset();
@@ -218,8 +205,8 @@ MappingBlock<HBA_FCPTARGETMAPPING> HA_GetTargetMappings(HBA_HANDLE handle) {
         room = roomForCount(count);
         mapping = allocateMapping(mappingBlockSize<HBA_FCPTARGETMAPPING, HBA_FCPSCSIENTRYV2>(count));
         if (!mapping) {
-            leaveWithHaltEx("HA_GetTargetMappings", "Failed to allocate target mappings\n",
-                            "No memory for target mappings\n");
+            trace.logAndFail<THaltEx>("Failed to allocate target mappings\n",
+                                      "No memory for target mappings\n");
         }
         mapping->NumberOfEntries = count;
         logPrintf("Invoking HBA_GetFcpTargetMapping to get <%d> target mappings\n",
@@ -229,9 +216,9 @@ MappingBlock<HBA_FCPTARGETMAPPING> HA_GetTargetMappings(HBA_HANDLE handle) {
         if (status != HBA_STATUS_OK) {
             logPrintf("Failed to get <%d> target mappings - %s\n", static_cast<int32>(count),
                       hbaStatusName(status));
-            leaveWithHbaapiEx("HA_GetTargetMappings", "HBA_GetFcpTargetMapping method failed\n");
+            trace.fail<THbaapiEx>("HBA_GetFcpTargetMapping method failed\n");
         }
     }
-    TRACE_EXIT("HA_GetTargetMappings");
+    trace.exit();
     return withinBlock(std::move(mapping), room);
 }

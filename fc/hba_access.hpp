@@ -23,17 +23,17 @@ public:
     ~PortAttributes();
 
     uint32 count() const { return mCount; }
-    bool hasRoom() const { return mpRecords != nullptr; }
+    bool hasRoom() const { return mRecords != nullptr; }
     // Makes every record. False when there is no memory.
     bool allocateRecords();
-    HBA_PORTATTRIBUTES& operator[](uint32 index) { return *mpRecords[index]; }
-    const HBA_PORTATTRIBUTES& operator[](uint32 index) const { return *mpRecords[index]; }
+    HBA_PORTATTRIBUTES& operator[](uint32 index) { return *mRecords[index]; }
+    const HBA_PORTATTRIBUTES& operator[](uint32 index) const { return *mRecords[index]; }
 
 private:
     uint32 mCount;
     uint32 mMade = 0; // records that exist
     // Set up to the last record that exists: a count that a library made up costs no memory.
-    HBA_PORTATTRIBUTES** mpRecords = nullptr;
+    HBA_PORTATTRIBUTES** mRecords = nullptr;
 };
 
 // A target mapping of either layout: one zeroed malloc block, an entry count and then the entries.

@@ -1,35 +1,55 @@
 #include "fc/tree_build.hpp"
 
+#include <algorithm>
 #include <cstdlib>
 #include <exception>
 #include <list>
-#include <map>
+#include <memory>
+#include <utility>
 #include <vector>
 
 #include "fc/adapter_report.hpp"
-#include "fc/unique_lun_id.hpp"
+#include "fc/identity/unique_lun_id.hpp"
 #include "fc/wwn.hpp"
 #include "foundation/clib_memory.hpp"
 #include "foundation/exceptions.hpp"
-#include "foundation/map.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
-#include "main/device_register.hpp"
-#include "main/run_state.hpp"
+#include "main/shared/device_register.hpp"
+#include "main/shared/run_state.hpp"
 
 namespace {
 
-using AttributesTable = ZebMap<HBA_HANDLE, std::shared_ptr<const HBA_ADAPTERATTRIBUTES>>;
-using PortsTable = ZebMap<HBA_HANDLE, std::shared_ptr<const PortAttributes>>;
-using BuiltMapping = std::shared_ptr<HBA_FCPTARGETMAPPINGV2>;
-using MappingsTable = ZebMap<HBA_HANDLE, BuiltMapping>;
+using BuiltMapping = MappingBlock<HBA_FCPTARGETMAPPINGV2>;
 
-// What the pass has found, by adapter handle, in the order of opening.
-std::list<HBA_HANDLE> gAdapterHandles;
-AttributesTable::Map gAdapterAttributes;
-PortsTable::Map gPortAttributes;
-MappingsTable::Map gTargetMappings;
-// Mappings that no table holds: the library's own, and built ones without an entry. Kept until exit.
-std::vector<std::shared_ptr<const void>> gUnstoredMappings;
+// An adapter from its opening to the clean-up, and what has been found of it.
+struct OpenAdapter {
+    explicit OpenAdapter(HBA_HANDLE opened) : handle(opened) {}
+
+    HBA_HANDLE handle;
+    std::unique_ptr<HBA_ADAPTERATTRIBUTES> attributes; // null as well for one that is not supported
+    std::unique_ptr<PortAttributes> ports;
+    BuiltMapping mapping{nullptr, &std::free};
+};
+
+std::list<OpenAdapter> gOpenAdapters; // in the order of opening
+
+// The record of `handle`: of the first adapter, should the library have given several the same handle.
+OpenAdapter& openAdapter(HBA_HANDLE handle) {
+    const auto found = std::find_if(gOpenAdapters.begin(), gOpenAdapters.end(),
+                                    [&](const OpenAdapter& adapter) { return adapter.handle == handle; });
+    return found != gOpenAdapters.end() ? *found : gOpenAdapters.emplace_back(handle);
+}
+
+// Keeps `found` in its place of a record. Throws ExistsEx when another adapter of the same handle was first.
+template <typename Owner>
+void store(Owner& place, Owner found) {
+    if (place != nullptr) {
+        logPrintf("Element already existed in the map\n");
+        throw ExistsEx("Element already exists in map.. can't insert\n");
+    }
+    place = std::move(found);
+}
 
 timeval wallClock() {
     timeval now = {};
@@ -37,14 +57,13 @@ timeval wallClock() {
     return now;
 }
 
-// A zeroed mapping with room for `capacity` entries, and a count of 0, for sBuildTargetMappings. Throws
-// NoMemoryEx "No Memory\n".
-BuiltMapping allocateBuiltMapping(uint32 capacity) {
+// A zeroed mapping with room for `capacity` entries, and a count of 0, for the function that `trace` is of.
+// Throws NoMemoryEx "No Memory\n".
+BuiltMapping allocateBuiltMapping(uint32 capacity, const FunctionTrace& trace) {
     const std::size_t size = mappingBlockSize<HBA_FCPTARGETMAPPINGV2, HBA_FCPSCSIENTRYV2>(capacity);
     void* const block = size != 0 ? std::calloc(1, size) : nullptr;
     if (block == nullptr) {
-        TRACE_EXIT("sBuildTargetMappings");
-        throw NoMemoryEx("No Memory\n");
+        trace.fail<NoMemoryEx>("No Memory\n");
     }
     return {static_cast<HBA_FCPTARGETMAPPINGV2*>(block), &std::free};
 }
@@ -130,11 +149,11 @@ bool identify(const HBA_FCPSCSIENTRY& entry, HBA_FCPSCSIENTRYV2& slot) {
     return true;
 }
 
-BuiltMapping buildTargetMappings(HBA_HANDLE handle) {
+// The adapter's mapping with every LUN identified. Throws THbaapiEx when the library does not give it.
+BuiltMapping buildTargetMappings(HBA_HANDLE handle, const FunctionTrace& trace) {
     logPrintf("Going to get target mappings\n");
-    const std::shared_ptr<const HBA_FCPTARGETMAPPING> source = HA_GetTargetMappings(handle);
-    gUnstoredMappings.push_back(source);
-    BuiltMapping result = allocateBuiltMapping(source->NumberOfEntries);
+    const MappingBlock<HBA_FCPTARGETMAPPING> source = HA_GetTargetMappings(handle);
+    BuiltMapping result = allocateBuiltMapping(source->NumberOfEntries, trace);
     for (uint32 i = 0; i < source->NumberOfEntries; ++i) {
         logVendorData(source->entry[i]);
     }
@@ -147,33 +166,22 @@ BuiltMapping buildTargetMappings(HBA_HANDLE handle) {
     }
     if (result->NumberOfEntries != 0) {
         logPrintf("Storing Target Mappings %p\n", static_cast<const void*>(result.get()));
-        MappingsTable::insert(gTargetMappings, handle, result);
-    } else {
-        gUnstoredMappings.push_back(result);
     }
     return result;
 }
 
-void releaseAdapter(HBA_HANDLE handle) {
-    uint32 portCount = 0;
+void releaseAdapter(const OpenAdapter& adapter) {
     logPrintf("Finding and deleting adapter attributes...\n");
-    if (AttributesTable::contains(gAdapterAttributes, handle)) {
-        portCount = AttributesTable::lookup(gAdapterAttributes, handle)->NumberOfPorts;
-        gAdapterAttributes.erase(handle);
-    }
     logPrintf("Finding and delete port attributes...\n");
-    if (PortsTable::contains(gPortAttributes, handle)) {
-        logPrintf("Deleting %u port attributes...\n", portCount);
-        gPortAttributes.erase(handle);
+    if (adapter.ports != nullptr) {
+        logPrintf("Deleting %u port attributes...\n", adapter.ports->count());
     }
     logPrintf("Finding and deleting target mappings...\n");
-    if (MappingsTable::contains(gTargetMappings, handle)) {
-        logPrintf("Deleting %p\n",
-                  static_cast<const void*>(MappingsTable::lookup(gTargetMappings, handle).get()));
-        gTargetMappings.erase(handle);
+    if (adapter.mapping != nullptr && adapter.mapping->NumberOfEntries != 0) {
+        logPrintf("Deleting %p\n", static_cast<const void*>(adapter.mapping.get()));
     }
     logPrintf("Going to close adapter...\n");
-    HA_CloseAdapter(handle);
+    HA_CloseAdapter(adapter.handle);
 }
 
 } // namespace
@@ -206,65 +214,64 @@ std::string expandAdapterName(const char* name) {
 }
 
 const HBA_ADAPTERATTRIBUTES* sBuildAdapterAttributes(HBA_HANDLE handle) {
-    TRACE_ENTRY("sBuildAdapterAttributes");
+    const FunctionTrace trace("sBuildAdapterAttributes");
     logPrintf("Going to get Adapter Attributes\n");
-    const std::shared_ptr<const HBA_ADAPTERATTRIBUTES> attributes = HA_GetAdapterAttributes(handle);
-    if (attributes) {
+    std::unique_ptr<HBA_ADAPTERATTRIBUTES> attributes = HA_GetAdapterAttributes(handle);
+    const HBA_ADAPTERATTRIBUTES* const record = attributes.get();
+    if (attributes != nullptr) {
         logPrintf("Storing Adapter Attributes\n");
-        AttributesTable::insert(gAdapterAttributes, handle, attributes);
+        store(openAdapter(handle).attributes, std::move(attributes));
     }
-    TRACE_EXIT("sBuildAdapterAttributes");
-    return attributes.get();
+    trace.exit();
+    return record;
 }
 
 const PortAttributes& sBuildPortAttributes(HBA_HANDLE handle, const HBA_ADAPTERATTRIBUTES& adapter) {
-    TRACE_ENTRY("sBuildPortAttributes");
+    const FunctionTrace trace("sBuildPortAttributes");
     logPrintf("Going to get adapter ports\n");
-    const std::shared_ptr<const PortAttributes> ports = HA_GetAdapterPorts(handle, adapter);
+    std::unique_ptr<PortAttributes> ports = HA_GetAdapterPorts(handle, adapter);
+    const PortAttributes& records = *ports;
     logPrintf("Storing Port Attributes\n");
-    PortsTable::insert(gPortAttributes, handle, ports);
-    TRACE_EXIT("sBuildPortAttributes");
-    return *ports;
+    store(openAdapter(handle).ports, std::move(ports));
+    trace.exit();
+    return records;
 }
 
 const HBA_FCPTARGETMAPPINGV2& sBuildTargetMappings(HBA_HANDLE handle) {
-    TRACE_ENTRY("sBuildTargetMappings");
-    BuiltMapping mapping;
+    const FunctionTrace trace("sBuildTargetMappings");
+    BuiltMapping& mapping = openAdapter(handle).mapping;
     try {
-        mapping = buildTargetMappings(handle);
+        mapping = buildTargetMappings(handle, trace);
     } catch (const THbaapiEx&) {
-        mapping = allocateBuiltMapping(0);
-        gUnstoredMappings.push_back(mapping);
+        mapping = allocateBuiltMapping(0, trace);
     }
-    TRACE_EXIT("sBuildTargetMappings");
+    trace.exit();
     return *mapping;
 }
 
 void sBuildAdapterTreeAndOutput(HBA_HANDLE handle) {
-    TRACE_ENTRY("sBuildAdapterTreeAndOutput");
+    const FunctionTrace trace("sBuildAdapterTreeAndOutput");
     const HBA_ADAPTERATTRIBUTES* const attributes = sBuildAdapterAttributes(handle);
     if (attributes != nullptr) {
         const PortAttributes& ports = sBuildPortAttributes(handle, *attributes);
         const HBA_FCPTARGETMAPPINGV2& mapping = sBuildTargetMappings(handle);
         HA_PrintAdapterTree(*attributes, ports, mapping, gLogStream);
     }
-    TRACE_EXIT("sBuildAdapterTreeAndOutput");
+    trace.exit();
 }
 
 void sBuildAndOutput() {
-    TRACE_ENTRY("sBuildAndOutput");
+    const FunctionTrace trace("sBuildAndOutput");
     const timeval start = wallClock();
     const uint32 count = HA_GetNumberOfAdapters();
     if (count == 0) {
-        logPrintf("The system does not have any adapters\n");
-        TRACE_EXIT("sBuildAndOutput");
-        throw THaltEx("There are no adapters on the system\n");
+        trace.logAndFail<THaltEx>("The system does not have any adapters\n",
+                                  "There are no adapters on the system\n");
     }
     // No 32-bit program could hold that many names, whatever the library says.
     constexpr uint32 kMostNames = 0x7FFFFFFF / 16;
     if (count > kMostNames) {
-        TRACE_EXIT("sBuildAndOutput");
-        throw NoMemoryEx("No Memory\n");
+        trace.fail<NoMemoryEx>("No Memory\n");
     }
     std::vector<ZebString> names(count);
     HA_GetAdapterNames(count, names);
@@ -275,7 +282,7 @@ void sBuildAndOutput() {
         try {
             const HBA_HANDLE handle = HA_OpenAdapter(name.data());
             logPrintf("Storing Adapter Handle\n");
-            gAdapterHandles.push_back(handle);
+            gOpenAdapters.emplace_back(handle);
             sBuildAdapterTreeAndOutput(handle);
         } catch (const std::exception&) {
             logPrintf("Exception occured while opening adapter: %s\n", name.c_str());
@@ -283,27 +290,24 @@ void sBuildAndOutput() {
     }
     const timeval end = wallClock();
     logPrintf("Time taken to build tree: %.2f milliseconds\n", elapsedMilliseconds(start, end));
-    TRACE_EXIT("sBuildAndOutput");
+    trace.exit();
 }
 
 void sFirstBuildAndOutput() {
-    TRACE_ENTRY("sFirstBuildAndOutput");
+    const FunctionTrace trace("sFirstBuildAndOutput");
     const timeval start = wallClock();
     HA_LoadHbaapi();
     const timeval end = wallClock();
     logPrintf("Time taken to load HBAAPI: %.2f milliseconds\n", elapsedMilliseconds(start, end));
     sBuildAndOutput();
-    TRACE_EXIT("sFirstBuildAndOutput");
+    trace.exit();
 }
 
 void cleanUpFcTree() {
-    for (const HBA_HANDLE handle : gAdapterHandles) {
-        releaseAdapter(handle);
+    for (const OpenAdapter& adapter : gOpenAdapters) {
+        releaseAdapter(adapter);
     }
-    gAdapterHandles.clear();
-    gAdapterAttributes.clear();
-    gPortAttributes.clear();
-    gTargetMappings.clear();
+    gOpenAdapters.clear();
     logPrintf("Going to free library\n");
     HA_FreeHbaapi();
 }

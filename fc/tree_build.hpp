@@ -20,12 +20,13 @@ void cleanUpFcTree();
 // The steps of the pass, from the outside in.
 void sBuildAndOutput();
 void sBuildAdapterTreeAndOutput(HBA_HANDLE handle);
+// These three hand out what they keep until the clean-up.
 // The stored record, or null for an adapter that is not supported.
 const HBA_ADAPTERATTRIBUTES* sBuildAdapterAttributes(HBA_HANDLE handle);
 const PortAttributes& sBuildPortAttributes(HBA_HANDLE handle, const HBA_ADAPTERATTRIBUTES& adapter);
-// The built mapping, which lives until exit or, when it is not empty, until the clean-up: the source entry i
-// is in slot i, unless it was left out, and the count is that of the entries that were not. Throws
-// NoMemoryEx, and what HA_GetScsiUniqueLunId throws except NotFoundEx and NotSupportedEx.
+// The built mapping: the source entry i is in slot i, unless it was left out, and the count is that of the
+// entries that were not. Throws NoMemoryEx, and what HA_GetScsiUniqueLunId throws except NotFoundEx and
+// NotSupportedEx.
 const HBA_FCPTARGETMAPPINGV2& sBuildTargetMappings(HBA_HANDLE handle);
 
 // Milliseconds from `start` to `end`; logs both.

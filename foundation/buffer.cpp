@@ -3,6 +3,7 @@
 #include <cctype>
 #include <cstdlib>
 
+#include "foundation/assertion.hpp"
 #include "foundation/clib_memory.hpp"
 #include "foundation/clib_stream.hpp"
 #include "foundation/exceptions.hpp"
@@ -12,7 +13,7 @@
 // NOLINTBEGIN(modernize-use-nullptr)
 
 ZebBuffer::ZebBuffer(uint32 acUseLength, uint32 acMaxLength) {
-    TRACE_ENTRY("ZebBuffer");
+    const FunctionTrace trace("ZebBuffer");
     ASSERT_OR_EXIT((acMaxLength == 0 || acUseLength <= acMaxLength));
     const uint32 lMallocLength = acMaxLength != 0 ? acMaxLength : acUseLength;
     ASSERT_OR_EXIT(lMallocLength != 0);
@@ -28,7 +29,7 @@ ZebBuffer::ZebBuffer(uint32 acUseLength, uint32 acMaxLength) {
     ASSERT_OR_EXIT(mUseLength <= mMaxLength);
     mcpPointer = nullptr;
     try {
-        TRACE_EXIT("ZebBuffer");
+        trace.exit();
     } catch (...) {
         std::free(mpPointer); // no destructor runs for an object whose constructor throws
         throw;
@@ -37,34 +38,34 @@ ZebBuffer::ZebBuffer(uint32 acUseLength, uint32 acMaxLength) {
 
 ZebBuffer::ZebBuffer(const uint8* acpPointer, uint32 acLength)
     : mcpPointer(acpPointer), mUseLength(acLength), mMaxLength(acLength), mPersistence(ZebBP_Persistent) {
-    TRACE_ENTRY("ZebBuffer");
-    TRACE_EXIT("ZebBuffer");
+    const FunctionTrace trace("ZebBuffer");
+    trace.exit();
 }
 
 ZebBuffer::~ZebBuffer() {
-    traceEntryNoThrow("~ZebBuffer");
+    const FunctionTrace trace(std::nothrow, "~ZebBuffer");
     _destroy();
-    traceExitNoThrow("~ZebBuffer");
+    trace.exit();
 }
 
 void ZebBuffer::_destroy() noexcept {
-    traceEntryNoThrow("_destroy");
+    const FunctionTrace trace(std::nothrow, "_destroy");
     if (mPersistence == ZebBP_NonPersistent && mpPointer != nullptr) {
-        logPrintfNoThrow("Freeing persistent allocated buffer\n");
+        trace.log("Freeing persistent allocated buffer\n");
         std::free(mpPointer);
     } else {
-        logPrintfNoThrow("Not freeing non-persistent buffer, nullifying pointer\n");
+        trace.log("Not freeing non-persistent buffer, nullifying pointer\n");
     }
     mpPointer = nullptr;
     mcpPointer = nullptr;
     mUseLength = 0;
     mMaxLength = 0;
     mPersistence = {};
-    traceExitNoThrow("_destroy");
+    trace.exit();
 }
 
 uint8 ZebBuffer::byte(uint32 acOffset) const {
-    TRACE_ENTRY("byte");
+    const FunctionTrace trace("byte");
     ASSERT_OR_EXIT(acOffset < this->mUseLength);
     if (mPersistence == ZebBP_NonPersistent) {
         ASSERT_OR_EXIT(this->mpPointer != __null);
@@ -75,7 +76,7 @@ uint8 ZebBuffer::byte(uint32 acOffset) const {
 }
 
 ZebBuffer::operator const uint8*() const {
-    TRACE_ENTRY("operator const uint8*");
+    const FunctionTrace trace("operator const uint8*");
     if (mPersistence == ZebBP_NonPersistent) {
         ASSERT_OR_EXIT(this->mpPointer != __null);
         return mpPointer;
@@ -85,66 +86,66 @@ ZebBuffer::operator const uint8*() const {
 }
 
 ZebBuffer::operator uint8*() {
-    TRACE_ENTRY("operator uint8*");
+    const FunctionTrace trace("operator uint8*");
     ASSERT_OR_EXIT(ZebBP_NonPersistent == this->mPersistence);
     ASSERT_OR_EXIT(__null != this->mpPointer);
-    TRACE_EXIT("operator uint8*");
+    trace.exit();
     return mpPointer;
 }
 
 void ZebBuffer::setLength(uint32 acLength) {
-    TRACE_ENTRY("setLength");
+    const FunctionTrace trace("setLength");
     ASSERT_OR_EXIT(ZebBP_NonPersistent == this->mPersistence);
     ASSERT_OR_EXIT(acLength <= this->mMaxLength);
     ASSERT_OR_EXIT(__null != this->mpPointer);
     mUseLength = acLength;
     Clib_memset(mpPointer, 0, mMaxLength);
-    TRACE_EXIT("setLength");
+    trace.exit();
 }
 
 void ZebBuffer::copy(const uint8* acpSource, uint32 acLength) {
-    TRACE_ENTRY("copy");
+    const FunctionTrace trace("copy");
     ASSERT_OR_EXIT(acLength != 0 && acLength <= this->mUseLength);
     ASSERT_OR_EXIT(__null != this->mpPointer);
     Clib_memcpy(mpPointer, acpSource, acLength);
-    TRACE_EXIT("copy");
+    trace.exit();
 }
 
 void ZebBuffer::append(const uint8* acpSource, uint32 acBytes) {
-    TRACE_ENTRY("append");
+    const FunctionTrace trace("append");
     const uint64 acLength = acBytes; // a sum that cannot wrap
     ASSERT_OR_EXIT(acLength != 0 && (acLength + this->mUseLength) < this->mMaxLength);
     ASSERT_OR_EXIT(__null != this->mpPointer);
     Clib_memcpy(mpPointer + mUseLength, acpSource, acBytes);
     mUseLength += acBytes;
-    TRACE_EXIT("append");
+    trace.exit();
 }
 
 void ZebBuffer::erase() {
-    TRACE_ENTRY("erase");
+    const FunctionTrace trace("erase");
     ASSERT_OR_EXIT(ZebBP_NonPersistent == this->mPersistence);
     ASSERT_OR_EXIT(__null != this->mpPointer);
     Clib_memset(mpPointer, 0, mMaxLength);
-    TRACE_EXIT("erase");
+    trace.exit();
 }
 
 void ZebBuffer::writeAscii(char* acpOutput) const {
     constexpr uint32 kColumns = 16;
-    TRACE_ENTRY("writeAscii");
-    const uint32 lLength = length();
+    const FunctionTrace trace("writeAscii");
+    const uint32 used = length();
     const uint8* const lcpData = mPersistence == ZebBP_NonPersistent ? mpPointer : mcpPointer;
-    const uint32 lRows = lLength / kColumns + (lLength % kColumns != 0 ? 1 : 0);
-    for (uint32 row = 0; row < lRows; ++row) {
-        char lHex[3 * kColumns + 1] = {};
-        char lAscii[kColumns + 1] = {};
-        for (uint32 column = 0; column < kColumns && row * kColumns + column < lLength; ++column) {
-            const uint8 lByte = lcpData[row * kColumns + column];
-            Clib_sprintf(lHex + 3 * static_cast<std::size_t>(column), lByte > 15 ? "%X " : "0%X ", lByte);
-            lAscii[column] = std::isprint(lByte) != 0 ? static_cast<char>(lByte) : '.';
+    const uint32 rows = used / kColumns + (used % kColumns != 0 ? 1 : 0);
+    for (uint32 row = 0; row < rows; ++row) {
+        char hex[3 * kColumns + 1] = {};
+        char ascii[kColumns + 1] = {};
+        for (uint32 column = 0; column < kColumns && row * kColumns + column < used; ++column) {
+            const uint8 byte = lcpData[row * kColumns + column];
+            Clib_sprintf(hex + 3 * static_cast<std::size_t>(column), byte > 15 ? "%X " : "0%X ", byte);
+            ascii[column] = std::isprint(byte) != 0 ? static_cast<char>(byte) : '.';
         }
-        Clib_sprintf(acpOutput + Clib_strlen(acpOutput), "%8u: %s %s\n", row * kColumns, lHex, lAscii);
+        Clib_sprintf(acpOutput + Clib_strlen(acpOutput), "%8u: %s %s\n", row * kColumns, hex, ascii);
     }
-    TRACE_EXIT("writeAscii");
+    trace.exit();
 }
 
 // NOLINTEND(modernize-use-nullptr)

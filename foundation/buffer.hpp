@@ -34,13 +34,12 @@ public:
 
     // The byte in use at `acOffset`.
     virtual uint8 byte(uint32 acOffset) const;
-    // The first byte; owned as the block is.
-    virtual
-    operator const uint8*() const; // NOLINT(google-explicit-constructor): its trace name is the operator's
+    // The first byte; owned as the block is. The trace shows the two conversions as operators.
+    virtual operator const uint8*() const; // NOLINT(google-explicit-constructor)
     // The number of bytes in use.
     virtual uint32 length() const { return mUseLength; }
     // The first byte of an owned block, to write to.
-    virtual operator uint8*(); // NOLINT(google-explicit-constructor): its trace name is the operator's
+    virtual operator uint8*(); // NOLINT(google-explicit-constructor)
     // Puts `acLength` bytes of an owned block in use and fills the whole block with zeros: the content is
     // gone.
     virtual void setLength(uint32 acLength);

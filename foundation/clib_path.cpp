@@ -8,10 +8,10 @@
 #include <cstring>
 #include <string>
 
+#include "foundation/assertion.hpp"
 #include "foundation/clib_error.hpp"
 #include "foundation/clib_stream.hpp"
 #include "foundation/exceptions.hpp"
-#include "foundation/trace.hpp"
 
 namespace {
 

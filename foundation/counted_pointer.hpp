@@ -5,10 +5,11 @@
 #include <cstddef>
 #include <cstdlib>
 #include <new>
+#include <utility>
 
+#include "foundation/assertion.hpp"
 #include "foundation/exceptions.hpp"
 #include "foundation/integers.hpp"
-#include "foundation/trace.hpp"
 
 // The assertions spell null pointers as the log shows them, and the analyzer cannot count references.
 // NOLINTBEGIN(modernize-use-nullptr,clang-analyzer-cplusplus.NewDelete*,clang-analyzer-unix.Malloc)
@@ -50,15 +51,24 @@ public:
     ZebCountedPointer(const ZebCountedPointer& acrCopy) {
         ASSERT_OR_EXIT(0 != acrCopy.mPointer);
         ASSERT_OR_EXIT(0 != acrCopy.mReferenceCount);
-        share(acrCopy);
+        mPointer = acrCopy.mPointer;
+        mReferenceCount = acrCopy.mReferenceCount;
+        mSizeType = acrCopy.mSizeType;
+        mAllocationType = acrCopy.mAllocationType;
+        mReferenceCount->increment();
     }
 
     ZebCountedPointer& operator=(const ZebCountedPointer& acrCopy) {
         ASSERT_OR_EXIT(0 != acrCopy.mPointer);
         ASSERT_OR_EXIT(0 != acrCopy.mReferenceCount);
         if (this != &acrCopy) {
-            letGo();
-            share(acrCopy);
+            // Shared first: the object that is let go of may hold `acrCopy` itself, as the head of a list
+            // does its next element.
+            ZebCountedPointer copy(acrCopy);
+            std::swap(mPointer, copy.mPointer);
+            std::swap(mReferenceCount, copy.mReferenceCount);
+            std::swap(mSizeType, copy.mSizeType);
+            std::swap(mAllocationType, copy.mAllocationType);
         }
         return *this;
     }
@@ -72,19 +82,21 @@ public:
         if (acpObject == nullptr) {
             throw NoMemoryEx("No Memory\n");
         }
-        auto* lpCounter = new (std::nothrow) ZebReferenceCounter;
-        if (lpCounter == nullptr) {
+        auto* counter = new (std::nothrow) ZebReferenceCounter;
+        if (counter == nullptr) {
             throw NoMemoryEx("No Memory\n");
         }
         mPointer = acpObject;
-        mReferenceCount = lpCounter;
+        mReferenceCount = counter;
         mSizeType = acSizeType;
         mAllocationType = acAllocationType;
     }
 
     // Gives up this copy's share, destroying the object when it was the last, and leaves the pointer empty.
     void release() {
-        letGo();
+        if (mPointer != nullptr && mReferenceCount != nullptr && mReferenceCount->decrement() == 0) {
+            destroy();
+        }
         mPointer = nullptr;
         mReferenceCount = nullptr;
         mSizeType = {};
@@ -126,20 +138,6 @@ private:
         ASSERT_OR_EXIT(0 != mReferenceCount);
         ASSERT_OR_EXIT(ZebPST_Individual == mSizeType);
         return mPointer;
-    }
-
-    void share(const ZebCountedPointer& acrCopy) {
-        mPointer = acrCopy.mPointer;
-        mReferenceCount = acrCopy.mReferenceCount;
-        mSizeType = acrCopy.mSizeType;
-        mAllocationType = acrCopy.mAllocationType;
-        mReferenceCount->increment();
-    }
-
-    void letGo() {
-        if (mPointer != nullptr && mReferenceCount != nullptr && mReferenceCount->decrement() == 0) {
-            destroy();
-        }
     }
 
     void destroy() {

@@ -8,7 +8,7 @@
 
 #include "foundation/exceptions.hpp"
 #include "foundation/integers.hpp"
-#include "foundation/trace.hpp"
+#include "foundation/log.hpp"
 #include "foundation/zeb_string.hpp"
 
 template <typename Key, typename Value>

@@ -1,33 +1,6 @@
 #include "foundation/trace.hpp"
 
-#include <cstdarg>
-#include <cstdlib>
-
-#include "foundation/clib_stream.hpp"
-#include "foundation/exceptions.hpp"
-
-std::FILE* gLogStream = nullptr;
-
-namespace {
-
-std::FILE* logStream() {
-    return gLogStream != nullptr ? gLogStream : stderr;
-}
-
-} // namespace
-
-int logPrintf(const char* format, ...) {
-    va_list arguments;
-    va_start(arguments, format);
-    try {
-        const int written = Clib_vfprintf(logStream(), format, arguments);
-        va_end(arguments);
-        return written;
-    } catch (...) {
-        va_end(arguments);
-        throw;
-    }
-}
+#include "foundation/log.hpp"
 
 void TRACE_ENTRY(const char* name, unsigned line) {
     logPrintf("Entered Function %s Line %u\n", name, line);
@@ -37,23 +10,27 @@ void TRACE_EXIT(const char* name, unsigned line) {
     logPrintf("Left Function %s Line %u\n", name, line);
 }
 
-void logPrintfNoThrow(const char* format, ...) noexcept {
-    va_list arguments;
-    va_start(arguments, format);
-    static_cast<void>(std::vfprintf(logStream(), format, arguments));
-    va_end(arguments);
+FunctionTrace::FunctionTrace(const char* name, unsigned line) : mName(name), mThrows(true) {
+    TRACE_ENTRY(name, line);
 }
 
-void traceEntryNoThrow(const char* name, unsigned line) noexcept {
+FunctionTrace::FunctionTrace(std::nothrow_t /*tag*/, const char* name, unsigned line) noexcept
+    : mName(name), mThrows(false) {
     logPrintfNoThrow("Entered Function %s Line %u\n", name, line);
 }
 
-void traceExitNoThrow(const char* name, unsigned line) noexcept {
-    logPrintfNoThrow("Left Function %s Line %u\n", name, line);
+void FunctionTrace::log(const char* text) const {
+    if (mThrows) {
+        logPrintf("%s", text);
+    } else {
+        logPrintfNoThrow("%s", text);
+    }
 }
 
-void assertionFailed(const char* conditionText) {
-    // The process ends here whether or not the log still takes the line.
-    logPrintfNoThrow("Assertion [ %s ] failed\n", conditionText);
-    std::exit(1);
+void FunctionTrace::exit(unsigned line) const {
+    if (mThrows) {
+        TRACE_EXIT(mName, line);
+    } else {
+        logPrintfNoThrow("Left Function %s Line %u\n", mName, line);
+    }
 }

@@ -1,34 +1,58 @@
-// The log: its stream, its printf, the entry and exit trace of every function, and the fatal assertion.
+// The trace that every function with logic of its own leaves in the log: its entry, and its exit where the
+// log's format has one.
 #pragma once
 
-#include <cstdio>
+#include <new>
 
-// Destination of every trace and report line; null until the run has opened its log file, and standard error
-// stands in for it then. Set once by the entry, never closed: exit flushes it. Not owned by anybody else.
-extern std::FILE* gLogStream;
+#include "foundation/log.hpp"
 
-// Formats like printf and writes to the log. Returns the number of characters written. Throws WriteFailedEx
-// "File write failed\n" when the stream refuses them. Nothing is flushed and nothing is added to the text.
-int logPrintf(const char* format, ...) __attribute__((format(printf, 1, 2)));
-
-// "Entered Function %s Line %u\n": the first statement of a traced function. `name` is the bare function
-// name, `line` the line of the statement itself. Throws as logPrintf.
+// "Entered Function %s Line %u\n" and "Left Function %s Line %u\n". `name` is the bare function name, `line`
+// the line of the statement itself. Throw as logPrintf.
 void TRACE_ENTRY(const char* name, unsigned line = __builtin_LINE());
-
-// "Left Function %s Line %u\n": before each normal return, and before a throw of the function's own.
-// Throws as logPrintf.
 void TRACE_EXIT(const char* name, unsigned line = __builtin_LINE());
 
-// logPrintf for destructors: a line that the stream refuses is lost, for an exception that leaves a
-// destructor would end the program.
-void logPrintfNoThrow(const char* format, ...) noexcept __attribute__((format(printf, 1, 2)));
-void traceEntryNoThrow(const char* name, unsigned line = __builtin_LINE()) noexcept;
-void traceExitNoThrow(const char* name, unsigned line = __builtin_LINE()) noexcept;
+// One call of a traced function. Made as the function's first statement, which logs the entry; helpers that
+// log for the function, or leave it, take the object. There is no exit at the end of its life: some ways out
+// of a function leave no line, by the log's format. Members throw as logPrintf, those of a trace that was
+// made with std::nothrow do not throw: an exception that leaves a destructor would end the program, so a line
+// that the stream refuses is lost there.
+class FunctionTrace {
+public:
+    // `name` outlives the object.
+    explicit FunctionTrace(const char* name, unsigned line = __builtin_LINE());
+    FunctionTrace(std::nothrow_t, const char* name, unsigned line = __builtin_LINE()) noexcept;
+    FunctionTrace(const FunctionTrace&) = delete;
+    FunctionTrace& operator=(const FunctionTrace&) = delete;
+    ~FunctionTrace() = default;
 
-// Logs "Assertion [ %s ] failed\n" with the condition's text and ends the process with status 1.
-[[noreturn]] void assertionFailed(const char* conditionText);
+    // Logs `text` as it stands.
+    void log(const char* text) const;
 
-// Ends the process when `condition` does not hold, in every build. The condition's source text is the text
-// that the log shows, so its spelling is part of the log's format.
-// NOLINTNEXTLINE(cppcoreguidelines-macro-usage): only the preprocessor can spell a condition.
-#define ASSERT_OR_EXIT(condition) ((condition) ? static_cast<void>(0) : assertionFailed(#condition))
+    // Before each normal return.
+    void exit(unsigned line = __builtin_LINE()) const;
+
+    // Leaves the function: logs the exit and throws.
+    template <typename Exception>
+    [[noreturn]] void fail(const char* message, unsigned line = __builtin_LINE()) const {
+        exit(line);
+        throw Exception(message);
+    }
+
+    // Leaves the function after a last line of it: logs `text` and the exit, and throws. The exception says
+    // the same as the line, or `message`.
+    template <typename Exception>
+    [[noreturn]] void logAndFail(const char* text, unsigned line = __builtin_LINE()) const {
+        log(text);
+        fail<Exception>(text, line);
+    }
+    template <typename Exception>
+    [[noreturn]] void logAndFail(const char* text, const char* message,
+                                 unsigned line = __builtin_LINE()) const {
+        log(text);
+        fail<Exception>(message, line);
+    }
+
+private:
+    const char* mName;
+    bool mThrows;
+};

@@ -4,8 +4,8 @@
 #include <new>
 #include <stdexcept>
 
+#include "foundation/assertion.hpp"
 #include "foundation/exceptions.hpp"
-#include "foundation/trace.hpp"
 
 // The assertions spell null pointers as the log shows them.
 // NOLINTBEGIN(modernize-use-nullptr)
@@ -28,9 +28,9 @@ ZebString& ZebString::operator=(const ZebString& acrCopy) {
 }
 
 void ZebString::take(std::string* apText) {
-    ZebCountedPointer<std::string> lText;
-    lText.create(apText, ZebPST_Individual, ZebPAT_New);
-    mString = lText;
+    ZebCountedPointer<std::string> text;
+    text.create(apText, ZebPST_Individual, ZebPAT_New);
+    mString = text;
 }
 
 bool ZebString::operator==(const char* acpString) const {
@@ -108,9 +108,9 @@ ZebString ZebString::substr(size_type pos, size_type n) const {
     ASSERT_OR_EXIT(mString != 0);
     ASSERT_OR_EXIT(pos <= mString->size());
     try {
-        ZebString lResult;
-        lResult.take(new (std::nothrow) std::string(mString->substr(pos, n)));
-        return lResult;
+        ZebString result;
+        result.take(new (std::nothrow) std::string(mString->substr(pos, n)));
+        return result;
     } catch (const std::out_of_range&) {
         throw InvalidEx("Invalid\n");
     }

@@ -6,18 +6,20 @@
 
 #include "foundation/clib_memory.hpp"
 #include "foundation/clib_stream.hpp"
+#include "foundation/directory.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
-#include "host/directory.hpp"
-#include "main/device_register.hpp"
-#include "main/device_report.hpp"
+#include "main/shared/banner.hpp"
+#include "main/shared/device_register.hpp"
+#include "main/shared/device_report.hpp"
 
 namespace {
 
 constexpr uint32 kGathered = 0;
 constexpr uint32 kGatherFailed = 5;
 
-// Whether the link that `pathFormat` names for `entryName` can be read and leads elsewhere than to
-// `virtualPrefix`, where the kernel keeps its virtual devices.
+// Whether the link at `path` can be read and leads elsewhere than to `virtualPrefix`, where the kernel keeps
+// its virtual devices.
 template <std::size_t Size>
 bool leadsToHardware(const char* path, const char (&virtualPrefix)[Size]) {
     char target[1024] = {};
@@ -38,7 +40,7 @@ bool isCandidate(const dirent& entry) {
         Clib_snprintf(path, sizeof path, "/sys/block/%s/device", entry.d_name);
         return leadsToHardware(path, "../../devices/virtual/");
     default:
-        Clib_fprintf(gLogStream, "|%s| is of no interest to us. Ignoring", entry.d_name);
+        reportPrintf("|%s| is of no interest to us. Ignoring", entry.d_name);
         return false;
     }
 }
@@ -46,11 +48,11 @@ bool isCandidate(const dirent& entry) {
 } // namespace
 
 uint32 gatherDasInfo() {
-    TRACE_ENTRY("gatherDasInfo");
+    const FunctionTrace trace("gatherDasInfo");
     const Directory directory("/sys/block/");
     if (!directory.isOpen()) {
-        Clib_fprintf(gLogStream, "Failed to open path '/sys/block/' can not get DAS info");
-        TRACE_EXIT("gatherDasInfo");
+        reportPrintf("Failed to open path '/sys/block/' can not get DAS info");
+        trace.exit();
         return kGatherFailed;
     }
     while (dirent* const entry = directory.next()) {
@@ -58,17 +60,15 @@ uint32 gatherDasInfo() {
             printDeviceTree(TREE_DAS, entry->d_name);
         }
     }
-    TRACE_EXIT("gatherDasInfo");
+    trace.exit();
     return kGathered;
 }
 
 void BuildDasTree_Linux() {
-    TRACE_ENTRY("BuildDasTree_Linux");
-    Clib_fprintf(gLogStream, "\n================================================\n");
-    Clib_fprintf(gLogStream, "============== DAS DEVICE DETAILS ==============");
-    Clib_fprintf(gLogStream, "\n================================================\n");
+    const FunctionTrace trace("BuildDasTree_Linux");
+    reportBanner("============== DAS DEVICE DETAILS ==============");
     if (gatherDasInfo() != 0) {
-        Clib_fprintf(gLogStream, "Error occured while fetching DAS devices. Failed to build DAS tree.\n");
+        reportPrintf("Error occured while fetching DAS devices. Failed to build DAS tree.\n");
     }
-    TRACE_EXIT("BuildDasTree_Linux");
+    trace.exit();
 }

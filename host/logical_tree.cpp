@@ -4,9 +4,11 @@
 #include <exception>
 
 #include "foundation/clib_stream.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
-#include "main/device_register.hpp"
-#include "main/device_report.hpp"
+#include "main/shared/banner.hpp"
+#include "main/shared/device_register.hpp"
+#include "main/shared/device_report.hpp"
 
 namespace {
 
@@ -23,7 +25,7 @@ void reportLine(char* line) {
     }
     const bool isBlank = line[std::strspn(line, " ")] == '\0';
     if (position == line || isBlank) {
-        Clib_fprintf(gLogStream, "Invalid /proc/pratitions entry: %s", line);
+        reportPrintf("Invalid /proc/pratitions entry: %s", line);
         return;
     }
     printDeviceTree(TREE_LOGICAL, position + 1);
@@ -33,7 +35,7 @@ void reportLine(char* line) {
 
 uint32 gatherLogicalInfo() {
     try {
-        TRACE_ENTRY("gatherLogicalInfo");
+        const FunctionTrace trace("gatherLogicalInfo");
         std::FILE* const stream = Clib_fopen("/proc/partitions", ClibFM_Read);
         char line[kLineSize] = {};
         while (Clib_fgets(line, sizeof line, stream) != nullptr) {
@@ -42,22 +44,19 @@ uint32 gatherLogicalInfo() {
             }
         }
         Clib_fclose(stream);
-        TRACE_EXIT("gatherLogicalInfo");
+        trace.exit();
         return kGathered;
     } catch (const std::exception&) {
-        Clib_fprintf(gLogStream, "Could not open /proc/partitions for read!");
+        reportPrintf("Could not open /proc/partitions for read!");
         return kGatherFailed;
     }
 }
 
 void BuildLogicalTree_Linux() {
-    TRACE_ENTRY("BuildLogicalTree_Linux");
-    Clib_fprintf(gLogStream, "\n================================================\n");
-    Clib_fprintf(gLogStream, "============ LOGICAL DEVICE DETAILS ============");
-    Clib_fprintf(gLogStream, "\n================================================\n");
+    const FunctionTrace trace("BuildLogicalTree_Linux");
+    reportBanner("============ LOGICAL DEVICE DETAILS ============");
     if (gatherLogicalInfo() != 0) {
-        Clib_fprintf(gLogStream,
-                     "Error occured while reading Logical devices. Failed to build Logical tree.\n");
+        reportPrintf("Error occured while reading Logical devices. Failed to build Logical tree.\n");
     }
-    TRACE_EXIT("BuildLogicalTree_Linux");
+    trace.exit();
 }

@@ -1,15 +1,14 @@
 #include "main/fc_tree.hpp"
 
 #include "fc/tree_build.hpp"
-#include "foundation/clib_stream.hpp"
 #include "foundation/exceptions.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
+#include "main/shared/banner.hpp"
 
 void BuildFcTree() {
-    TRACE_ENTRY("BuildFcTree");
-    Clib_fprintf(gLogStream, "\n================================================\n");
-    Clib_fprintf(gLogStream, "============== FC DEVICE DETAILS ===============");
-    Clib_fprintf(gLogStream, "\n================================================\n");
+    const FunctionTrace trace("BuildFcTree");
+    reportBanner("============== FC DEVICE DETAILS ===============");
     try {
         sFirstBuildAndOutput();
         cleanUpFcTree();
@@ -20,5 +19,5 @@ void BuildFcTree() {
     } catch (const TException& exception) {
         logPrintf("Caught Exception (%s) in testing 'BuildFcTree\n'", exception.what());
     }
-    TRACE_EXIT("BuildFcTree");
+    trace.exit();
 }

@@ -9,12 +9,13 @@
 #include "foundation/clib_path.hpp"
 #include "foundation/clib_stream.hpp"
 #include "foundation/exceptions.hpp"
-#include "foundation/trace.hpp"
+#include "foundation/log.hpp"
 #include "host/das_tree.hpp"
 #include "host/iscsi_tree.hpp"
 #include "host/logical_tree.hpp"
 #include "main/fc_tree.hpp"
-#include "main/run_state.hpp"
+#include "main/shared/banner.hpp"
+#include "main/shared/run_state.hpp"
 
 namespace {
 
@@ -48,15 +49,13 @@ void openLog() {
 }
 
 void checkMultipath() {
-    Clib_fprintf(gLogStream, "\n================================================\n");
-    Clib_fprintf(gLogStream, "\t\tCheck for Multipath software\n");
-    Clib_fprintf(gLogStream, "================================================\n");
+    reportBanner("\t\tCheck for Multipath software");
     logPrintf("Checking the powerpath\n");
     gPowerPath.sense();
     if (gPowerPath.isRunning()) {
         gPowerPath.printData();
     } else {
-        Clib_fprintf(gLogStream, "PowerPath is not Running\n");
+        reportPrintf("PowerPath is not Running\n");
     }
 }
 
@@ -65,7 +64,7 @@ void runGuarded(const char* treeName, void (*buildTree)()) {
     try {
         buildTree();
     } catch (const std::exception& exception) {
-        Clib_fprintf(gLogStream, "Caught exception while building %s tree: %s\n", treeName, exception.what());
+        reportPrintf("Caught exception while building %s tree: %s\n", treeName, exception.what());
     }
 }
 
@@ -85,9 +84,7 @@ void run() {
     runGuarded("DAS", BuildDasTree_Linux);
     runGuarded("LOGICAL", BuildLogicalTree_Linux);
 
-    Clib_fprintf(gLogStream, "\n================================================\n");
-    Clib_fprintf(gLogStream, "\t\t\t   END \n");
-    Clib_fprintf(gLogStream, "================================================\n");
+    reportBanner("\t\t\t   END ");
     if (gHostName != nullptr) {
         delete[] gHostName;
         gHostName = nullptr;

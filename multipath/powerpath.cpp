@@ -1,15 +1,17 @@
 #include "multipath/powerpath.hpp"
 
-#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
 
+#include "foundation/assertion.hpp"
 #include "foundation/clib_memory.hpp"
 #include "foundation/clib_stream.hpp"
 #include "foundation/clib_time.hpp"
+#include "foundation/command_output.hpp"
 #include "foundation/exceptions.hpp"
 #include "foundation/integers.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
 
 namespace {
@@ -23,11 +25,11 @@ constexpr uint32 kPauseMs = 20;
 
 using Text = std::unique_ptr<char, decltype(&std::free)>;
 
-Text zeroedText(const char* caller) {
+// Room for a command's output, for the function that `trace` is of. Throws NoMemoryEx "No Memory\n".
+Text zeroedText(const FunctionTrace& trace) {
     Text text(static_cast<char*>(std::calloc(ZebSensorLinuxPowerPathHandler::kOutputSize, 1)), &std::free);
     if (!text) {
-        TRACE_EXIT(caller);
-        throw NoMemoryEx("No Memory\n");
+        trace.fail<NoMemoryEx>("No Memory\n");
     }
     return text;
 }
@@ -35,14 +37,14 @@ Text zeroedText(const char* caller) {
 } // namespace
 
 void ZebSensorLinuxPowerPathHandler::sense() {
-    TRACE_ENTRY("sense");
+    const FunctionTrace trace("sense");
     LineList::List lines;
     logPrintf("Checking if emcpd is running\n");
     sExecuteCommand(kDaemonCheck, lines);
     if (lines.size() < kLeastLines) {
         mIsRunning = false;
         mPseudoDevices.clear();
-        TRACE_EXIT("sense");
+        trace.exit();
         return;
     }
     logPrintf("Getting the output of powermt command\n");
@@ -60,17 +62,17 @@ void ZebSensorLinuxPowerPathHandler::sense() {
         mIsRunning = false;
         mPseudoDevices.clear();
     }
-    TRACE_EXIT("sense");
+    trace.exit();
 }
 
 bool ZebSensorLinuxPowerPathHandler::isRunning() const {
-    TRACE_ENTRY("isRunning");
-    TRACE_EXIT("isRunning");
+    const FunctionTrace trace("isRunning");
+    trace.exit();
     return mIsRunning;
 }
 
 void ZebSensorLinuxPowerPathHandler::printData() {
-    TRACE_ENTRY("printData");
+    const FunctionTrace trace("printData");
     sense();
     if (mIsRunning) {
         logPrintf("PowerPath Data : Ulid  Pseudo Name\n");
@@ -78,31 +80,29 @@ void ZebSensorLinuxPowerPathHandler::printData() {
             logPrintf("               %s %s", ulid.c_str(), pseudoName.c_str());
         }
     }
-    TRACE_EXIT("printData");
+    trace.exit();
 }
 
 const ZebString& ZebSensorLinuxPowerPathHandler::getPseudoDevice(const ZebString& ulid) const {
-    TRACE_ENTRY("getPseudoDevice");
+    const FunctionTrace trace("getPseudoDevice");
     const auto found = mPseudoDevices.find(ulid);
     if (found == mPseudoDevices.end()) {
-        TRACE_EXIT("getPseudoDevice");
-        throw NotFoundEx("Element not found\n");
+        trace.fail<NotFoundEx>("Element not found\n");
     }
-    TRACE_EXIT("getPseudoDevice");
+    trace.exit();
     return found->second;
 }
 
 void ZebSensorLinuxPowerPathHandler::sExecuteCommand(const char* command, LineList::List& lines) {
-    TRACE_ENTRY("sExecuteCommand");
+    const FunctionTrace trace("sExecuteCommand");
     logPrintf("Calling popen\n");
-    // NOLINTNEXTLINE(cert-env33-c): the commands are fixed
-    std::unique_ptr<std::FILE, decltype(&pclose)> output(popen(command, "r"), &pclose);
-    if (!output) {
+    CommandOutput output(command);
+    if (!output.isOpen()) {
         logPrintf("Failed in popen\n");
-        TRACE_EXIT("sExecuteCommand");
+        trace.exit();
         return;
     }
-    const Text buffer = zeroedText("sExecuteCommand");
+    const Text buffer = zeroedText(trace);
     char* position = buffer.get();
     char* const end = buffer.get() + kOutputSize;
     try {
@@ -110,12 +110,12 @@ void ZebSensorLinuxPowerPathHandler::sExecuteCommand(const char* command, LineLi
             Clib_memset(position, 0, static_cast<std::size_t>(end - position));
             // A line that fills the buffer leaves room for no more bytes, and so ends the reading.
             const auto room = static_cast<std::size_t>(end - position) - 1;
-            const std::size_t count = Clib_fread(position, 1, room, output.get());
+            const std::size_t count = Clib_fread(position, 1, room, output.stream());
             if (count == 0) {
                 logPrintf("Fread returned ERROR\n");
-                output.reset();
+                output.close();
                 logPrintf("Number of lines in output: %u\n", static_cast<unsigned>(lines.size()));
-                TRACE_EXIT("sExecuteCommand");
+                trace.exit();
                 return;
             }
             position[count] = '\0';
@@ -124,15 +124,15 @@ void ZebSensorLinuxPowerPathHandler::sExecuteCommand(const char* command, LineLi
         }
     } catch (const ReadFailedEx& exception) {
         logPrintf("Failed to read - %s\n", exception.what());
-        output.reset();
-        TRACE_EXIT("sExecuteCommand");
+        output.close();
+        trace.exit();
         throw;
     }
 }
 
 char* ZebSensorLinuxPowerPathHandler::sBreakOutput(char* buffer, LineList::List& lines) {
-    TRACE_ENTRY("sBreakOutput");
-    const Text line = zeroedText("sBreakOutput");
+    const FunctionTrace trace("sBreakOutput");
+    const Text line = zeroedText(trace);
     char* cursor = buffer;
     while (char* const newline = std::strchr(cursor, '\n')) {
         *newline = '\0';
@@ -142,19 +142,19 @@ char* ZebSensorLinuxPowerPathHandler::sBreakOutput(char* buffer, LineList::List&
         cursor = newline + 1;
         if (*cursor == '\0') {
             logPrintf("End of popened Buffer\n");
-            TRACE_EXIT("sBreakOutput");
+            trace.exit();
             return buffer;
         }
     }
     logPrintf("Incomplete line: %s\n", cursor);
     const std::size_t rest = Clib_strlen(cursor);
     Clib_memmove(buffer, cursor, rest);
-    TRACE_EXIT("sBreakOutput");
+    trace.exit();
     return buffer + rest;
 }
 
 void ZebSensorLinuxPowerPathHandler::__parse(LineList::List& arOutput) {
-    TRACE_ENTRY("__parse");
+    const FunctionTrace trace("__parse");
     while (!arOutput.empty()) {
         ZebString pseudoName("");
         sParseOutputLine(arOutput, pseudoName);
@@ -174,16 +174,16 @@ void ZebSensorLinuxPowerPathHandler::__parse(LineList::List& arOutput) {
             LineList::pop_front(arOutput); // a pseudo device without its logical unit
         }
     }
-    TRACE_EXIT("__parse");
+    trace.exit();
 }
 
 void ZebSensorLinuxPowerPathHandler::sParseOutputLine(LineList::List& arOutput, ZebString& valueOut) {
-    TRACE_ENTRY("sParseOutputLine");
+    const FunctionTrace trace("sParseOutputLine");
     ASSERT_OR_EXIT(0 != arOutput.size()); // NOLINT(readability-container-size-empty): the log shows this text
     const ZebString line = LineList::front(arOutput);
     LineList::pop_front(arOutput);
     const ZebString::size_type lPos = line.find_first_of('=');
     ASSERT_OR_EXIT(lPos != ZebString::npos);
     valueOut = line.substr(lPos + 1, ZebString::npos);
-    TRACE_EXIT("sParseOutputLine");
+    trace.exit();
 }

@@ -22,6 +22,7 @@ private:
     void setData(ZebBuffer& data, int direction);
 
     // Released from the last to the first.
+    ZebCountedPointer<ZebBuffer> mDataOut; // the caller's: the driver's record points at its bytes
     ZebCountedPointer<ZebBuffer> mDataBuffer;
     ZebCountedPointer<ZebBuffer> mSenseBuffer;
     ZebCountedPointer<ZebBuffer> mCdb;

@@ -9,6 +9,7 @@
 
 #include "foundation/clib_file.hpp"
 #include "foundation/clib_stream.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
 #include "scsi/scsi_exceptions.hpp"
 #include "scsi/sense.hpp"
@@ -81,96 +82,92 @@ int32 elapsedMilliseconds(const timeb& start, const timeb& end) {
     return static_cast<int32>(seconds * 1000 + end.millitm - start.millitm);
 }
 
-[[noreturn]] void throwTimeOut(DoScsiIoExit exit) {
-    TRACE_EXIT("doScsiIo", exit);
-    logPrintf("Timeout\n");
-    throw TimeOutEx("Timeout\n");
-}
-
-[[noreturn]] void throwNotSupported(DoScsiIoExit exit, const char* text) {
-    TRACE_EXIT("doScsiIo", exit);
-    logPrintf("%s", text);
-    throw NotSupportedEx(text);
+// Leaves doScsiIo, whose last line stands behind its exit.
+template <typename Exception>
+[[noreturn]] void failAfterExit(const FunctionTrace& trace, DoScsiIoExit exit, const char* text) {
+    trace.exit(exit);
+    trace.log(text);
+    throw Exception(text);
 }
 
 } // namespace
 
 void ZebScsiIoHandlerLinux::open(const ZebString& path, int32& fdOut) {
-    TRACE_ENTRY("open");
+    const FunctionTrace trace("open");
     fdOut = Clib_open(path.c_str(), O_RDONLY | O_NONBLOCK, 0);
-    TRACE_EXIT("open");
+    trace.exit();
 }
 
 void ZebScsiIoHandlerLinux::close(int32 fd) {
-    TRACE_ENTRY("close");
+    const FunctionTrace trace("close");
     Clib_close(fd);
-    TRACE_EXIT("close");
+    trace.exit();
 }
 
 void ZebScsiIoHandlerLinux::doScsiIo(int32 fd, uint32 timeout_ms,
                                      const ZebCountedPointer<ZebScsiIoContext>& context) {
-    TRACE_ENTRY("doScsiIo");
+    const FunctionTrace trace("doScsiIo");
     if (!(context->ioObject() != nullptr)) {
-        TRACE_EXIT("doScsiIo");
+        trace.exit();
         logPrintf("No IoObject\n");
         throw NotSupportedEx("No IoObject\n");
     }
-    ZebCountedPointer<IoObject> lIoObject(context->ioObject());
-    sg_io_hdr& lHeader = lIoObject->header;
-    if (const MissingField* const lMissing = missingField(lHeader)) {
-        TRACE_EXIT("doScsiIo");
-        logPrintf("%s", lMissing->printed);
-        throw NotSupportedEx(lMissing->thrown);
+    ZebCountedPointer<IoObject> ioObject(context->ioObject());
+    sg_io_hdr& header = ioObject->header;
+    if (const MissingField* const missing = missingField(header)) {
+        trace.exit();
+        logPrintf("%s", missing->printed);
+        throw NotSupportedEx(missing->thrown);
     }
-    lHeader.timeout = timeout_ms;
+    header.timeout = timeout_ms;
 
-    const timeb lStart = wallClock();
-    const int lResult = ioctl(fd, SG_IO, lIoObject.get());
-    const int lErrno = errno;
-    const timeb lEnd = wallClock();
-    if (lResult < 0) {
-        lIoObject->ioctlState = kIoctlFailed;
-        TRACE_EXIT("doScsiIo", kExitIoctlFailed);
-        char lText[64] = {};
-        Clib_snprintf(lText, sizeof lText, "ioctl failed, error code = %d\n", lErrno);
-        logPrintf("%s\n", lText);
-        throw ScsiIoctlEx(lText);
+    const timeb start = wallClock();
+    const int result = ioctl(fd, SG_IO, ioObject.get());
+    const int error = errno;
+    const timeb end = wallClock();
+    if (result < 0) {
+        ioObject->ioctlState = kIoctlFailed;
+        trace.exit(kExitIoctlFailed);
+        char text[64] = {};
+        Clib_snprintf(text, sizeof text, "ioctl failed, error code = %d\n", error);
+        logPrintf("%s\n", text);
+        throw ScsiIoctlEx(text);
     }
-    lIoObject->ioctlState = kIoctlSucceeded;
-    if (elapsedMilliseconds(lStart, lEnd) > static_cast<int32>(timeout_ms)) {
-        throwTimeOut(kExitTookTooLong);
+    ioObject->ioctlState = kIoctlSucceeded;
+    if (elapsedMilliseconds(start, end) > static_cast<int32>(timeout_ms)) {
+        failAfterExit<TimeOutEx>(trace, kExitTookTooLong, "Timeout\n");
     }
 
-    const uint32 lDriver = lHeader.driver_status & 0x0FU;
-    if ((lHeader.host_status >= kHostNoConnect && lHeader.host_status <= kHostTimeOut) ||
-        lDriver == kDriverTimeOut) {
-        throwTimeOut(kExitGivenUp);
+    const uint32 driver = header.driver_status & 0x0FU;
+    if ((header.host_status >= kHostNoConnect && header.host_status <= kHostTimeOut) ||
+        driver == kDriverTimeOut) {
+        failAfterExit<TimeOutEx>(trace, kExitGivenUp, "Timeout\n");
     }
 
     // The doubled status byte, so CHECK CONDITION (02h) alone, without the driver's word for sense data, does
     // not count here: such a command is classified from its context.
-    const uint32 lStatus = (lHeader.status * 2U) & 0x7EU;
-    if (lStatus != 0x02 && lStatus != 0x22 && lDriver != kDriverSense) {
-        TRACE_EXIT("doScsiIo", kExitNormal);
+    const uint32 status = (header.status * 2U) & 0x7EU;
+    if (status != 0x02 && status != 0x22 && driver != kDriverSense) {
+        trace.exit(kExitNormal);
         return;
     }
-    const uint8* const lSense = lHeader.sbp;
-    const uint32 lSenseLength = std::min(lHeader.sb_len_wr, lHeader.mx_sb_len);
-    if (!isSensePresent(lSense, lSenseLength)) {
-        TRACE_EXIT("doScsiIo", kExitNormal);
+    const uint8* const sense = header.sbp;
+    const uint32 senseLength = std::min(header.sb_len_wr, header.mx_sb_len);
+    if (!isSensePresent(sense, senseLength)) {
+        trace.exit(kExitNormal);
         return;
     }
-    if (!isSenseWellFormed(lSense)) {
-        TRACE_EXIT("doScsiIo", kExitMalformedSense);
+    if (!isSenseWellFormed(sense)) {
+        trace.exit(kExitMalformedSense);
         logPrintf("No sensep or sb_len 0\n");
         return;
     }
-    const SenseHeader lDecoded = decodeSense(lSense, lSenseLength);
-    if (lDecoded.senseKey == kSenseKeyIllegalRequest) {
-        if (lDecoded.asc == 0x20 && lDecoded.ascq == 0x00) {
-            throwNotSupported(kExitInvalidOpcode, "Invalid opcode in CDB\n");
+    const SenseHeader decoded = decodeSense(sense, senseLength);
+    if (decoded.senseKey == kSenseKeyIllegalRequest) {
+        if (decoded.asc == 0x20 && decoded.ascq == 0x00) {
+            failAfterExit<NotSupportedEx>(trace, kExitInvalidOpcode, "Invalid opcode in CDB\n");
         }
-        throwNotSupported(kExitIllegalRequest, "Illegal request in CDB\n");
+        failAfterExit<NotSupportedEx>(trace, kExitIllegalRequest, "Illegal request in CDB\n");
     }
-    TRACE_EXIT("doScsiIo", kExitNormal);
+    trace.exit(kExitNormal);
 }

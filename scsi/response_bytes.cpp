@@ -8,24 +8,24 @@
 #include "foundation/exceptions.hpp"
 
 ZebString asciiText(const ResponseBytes& bytes, uint32 offset, uint32 count) {
-    const std::unique_ptr<char, decltype(&std::free)> lText(static_cast<char*>(std::calloc(count + 1, 1)),
-                                                            &std::free);
-    if (!lText) {
+    const std::unique_ptr<char, decltype(&std::free)> text(static_cast<char*>(std::calloc(count + 1, 1)),
+                                                           &std::free);
+    if (!text) {
         throw NoMemoryEx("No Memory\n");
     }
     for (uint32 i = 0; i < count; ++i) {
-        lText.get()[i] = static_cast<char>(bytes[offset + i]);
+        text.get()[i] = static_cast<char>(bytes[offset + i]);
     }
-    return {lText.get()};
+    return {text.get()};
 }
 
 ZebString hexText(const ResponseBytes& bytes, uint32 offset, uint32 count) {
-    std::string lText;
+    std::string text;
     for (uint32 i = 0; i < count; ++i) {
-        char lDigits[3] = {};
-        const uint8 lByte = bytes[offset + i];
-        Clib_snprintf(lDigits, sizeof lDigits, lByte > 15 ? "%X" : "0%X", lByte);
-        lText += lDigits;
+        char digits[3] = {};
+        const uint8 byte = bytes[offset + i];
+        Clib_snprintf(digits, sizeof digits, byte > 15 ? "%X" : "0%X", byte);
+        text += digits;
     }
-    return {lText.c_str()};
+    return {text.c_str()};
 }

@@ -9,14 +9,14 @@
 // can have sent, counts as zero.
 class ResponseBytes {
 public:
-    explicit ResponseBytes(const ZebBuffer& response) : mpBytes(response), mLength(response.length()) {}
+    explicit ResponseBytes(const ZebBuffer& response) : mBytes(response), mLength(response.length()) {}
 
-    uint8 operator[](uint32 offset) const { return offset < mLength ? mpBytes[offset] : uint8{0}; }
-    const uint8* data() const { return mpBytes; }
+    uint8 operator[](uint32 offset) const { return offset < mLength ? mBytes[offset] : uint8{0}; }
+    const uint8* data() const { return mBytes; }
     uint32 length() const { return mLength; }
 
 private:
-    const uint8* mpBytes;
+    const uint8* mBytes;
     uint32 mLength;
 };
 

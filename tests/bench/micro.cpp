@@ -4,8 +4,9 @@
 
 #include <benchmark/benchmark.h>
 
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
-#include "main/device_register.hpp"
+#include "main/shared/device_register.hpp"
 #include "scsi/inquiry.hpp"
 
 namespace {

@@ -11,7 +11,7 @@ import sys
 FOLDERS = ["main", "foundation", "fc", "host", "scsi", "multipath"]
 LITERAL = r'"(?:[^"\\\n]|\\.)*"'
 # Texts that only carry other texts.
-CARRIERS = {'"%s"', '"%s\\n"', '" %s\\n"'}
+CARRIERS = {'"%s"', '"\\n%s\\n%s\\n%s\\n"', '"%s\\n"', '" %s\\n"'}
 # Texts from which the program puts a line together; the reader knows the line.
 PIECES = {'"\\n"', '" %s\\n"', '"|_ Adapter wwnn "', '"|  |_ Initiator wwpn "', '"|  |  |_ Target wwnn "', '" wwpn "',
           '" bus %u target# %u\\n"', '"|_ Initiator IQN "', '"|  |_ Target IQN"'}
@@ -31,8 +31,17 @@ def literals_of(path):
 
 def sources(root):
     for folder in FOLDERS:
-        for path in sorted((root / folder).glob("*.[ch]pp")):
+        for path in sorted((root / folder).rglob("*.[ch]pp")):
             yield literals_of(path)
+
+
+def banner_lines(source):
+    """The lines that a banner is written in, each with the line ends that it has there."""
+    for rule in re.findall(r'"(=+)"', source):
+        yield rf'"{rule}\n"'
+        yield rf'"\n{rule}\n"'
+    for title in re.findall(rf"reportBanner\(({LITERAL})\)", source):
+        yield title[:-1] + r'\n"'
 
 
 def form(text):
@@ -69,7 +78,9 @@ def main():
     logged = set()
     for text in sources(root):
         literals.update(re.findall(LITERAL, text))
-        calls = rf"\b(?:logPrintf|logPrintfNoThrow|Clib_fprintf\((?:gLogStream|stream),)\(?\s*({LITERAL})"
+        literals.update(banner_lines(text))
+        calls = (rf"\b(?:(?:log|report)Printf(?:NoThrow)?\(|Clib_fprintf\(stream,|trace\.log\(|logAndFail<\w+>\("
+                 rf"|failAfterExit<\w+>\(trace, \w+,)\s*({LITERAL})")
         logged.update(re.findall(calls, text))
     missing = sorted(quoted - literals)
     unquoted = sorted(logged - quoted - CARRIERS)

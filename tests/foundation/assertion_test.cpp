@@ -1,7 +1,10 @@
+#include "foundation/assertion.hpp"
+
 #include <cstdio>
 
 #include <gtest/gtest.h>
 
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
 #include "tests/support/fatal.hpp"
 #include "tests/support/log_capture.hpp"

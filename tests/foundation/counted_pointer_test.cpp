@@ -358,4 +358,19 @@ TEST(ReferenceCounter, StartsAtOneAndReportsTheNewValueOfADecrement) {
     EXPECT_EQ(counter.decrement(), 0);
 }
 
+// An element of a list that each element holds the rest of.
+struct ListElement {
+    ZebCountedPointer<ListElement> next;
+    int value = 0;
+};
+
+TEST(CountedPointer, TakesAPointerThatTheObjectItLetsGoOfHolds) {
+    ZebCountedPointer<ListElement> head;
+    head.create(new (std::nothrow) ListElement, ZebPST_Individual, ZebPAT_New);
+    head->next.create(new (std::nothrow) ListElement, ZebPST_Individual, ZebPAT_New);
+    head->next->value = 2;
+    head = head->next;
+    EXPECT_EQ(head->value, 2);
+}
+
 } // namespace

@@ -1,6 +1,7 @@
 #include "foundation/trace.hpp"
 
-#include <cstdio>
+#include <new>
+#include <string>
 
 #include <gtest/gtest.h>
 
@@ -53,68 +54,72 @@ TEST(Trace, TravelsAsWriteFailedExWhenTheStreamRefusesIt) {
     EXPECT_EQ(messageOf<WriteFailedEx>([] { TRACE_EXIT("main"); }), kRefused);
 }
 
-TEST(LogPrintf, FormatsLikePrintfAndAddsNothing) {
-    const LogCapture log;
-    logPrintf("Element does not exist in the map");
-    logPrintf("%s %d %#x%%\n", "text", -5, 255U);
-    EXPECT_EQ(log.exactText(), "Element does not exist in the maptext -5 0xff%\n");
-}
-
-TEST(LogPrintf, ReturnsTheNumberOfCharactersWritten) {
-    const LogCapture log;
-    EXPECT_EQ(logPrintf("%s\n", "four"), 5);
-    EXPECT_EQ(logPrintf("%s", ""), 0);
-}
-
-TEST(LogPrintf, TakesALineOfAnyLength) {
-    const LogCapture log;
-    const std::string text(100000, 'x');
-    EXPECT_EQ(logPrintf("%s\n", text.c_str()), 100001);
-    EXPECT_EQ(log.exactText(), text + "\n");
-}
-
-TEST(LogPrintf, ThrowsWriteFailedExOnAFullDisk) {
-    gLogStream = std::fopen("/dev/full", "w");
-    static_cast<void>(std::setvbuf(gLogStream, nullptr, _IONBF, 0));
-    EXPECT_EQ(messageOf<WriteFailedEx>([] { logPrintf("Going to open HBAAPI library\n"); }), kRefused);
-    static_cast<void>(std::fclose(gLogStream));
-    gLogStream = nullptr;
-}
-
-TEST(LogPrintf, FlushesNothing) {
-    char* text = nullptr;
-    std::size_t size = 0;
-    gLogStream = open_memstream(&text, &size);
-    logPrintf("line\n");
-    EXPECT_EQ(size, 0U);
-    static_cast<void>(std::fclose(gLogStream));
-    gLogStream = nullptr;
-    EXPECT_EQ(std::string(text, size), "line\n");
-    std::free(text);
-}
-
 TEST(TraceOfADestructor, WritesTheSameLines) {
     const LogCapture log;
-    traceEntryNoThrow("~ZebBuffer");
-    logPrintfNoThrow("Freeing %s\n", "buffer");
-    traceExitNoThrow("~ZebBuffer");
+    const FunctionTrace trace(std::nothrow, "~ZebBuffer");
+    trace.log("Freeing 100% of it\n");
+    trace.exit();
     EXPECT_EQ(log.text(),
-              "Entered Function ~ZebBuffer Line #\nFreeing buffer\nLeft Function ~ZebBuffer Line #\n");
+              "Entered Function ~ZebBuffer Line #\nFreeing 100% of it\nLeft Function ~ZebBuffer Line #\n");
 }
 
 TEST(TraceOfADestructor, ShowsTheLineOfItsOwnStatement) {
     const LogCapture log;
     const int line = __LINE__;
-    traceEntryNoThrow("~ZebBuffer");
-    EXPECT_EQ(log.exactText(), "Entered Function ~ZebBuffer Line " + std::to_string(line + 1) + "\n");
+    const FunctionTrace trace(std::nothrow, "~ZebBuffer");
+    trace.exit();
+    EXPECT_EQ(log.exactText(), "Entered Function ~ZebBuffer Line " + std::to_string(line + 1) +
+                                   "\nLeft Function ~ZebBuffer Line " + std::to_string(line + 2) + "\n");
 }
 
 TEST(TraceOfADestructor, IsLostWhenTheStreamRefusesIt) {
     const RefusingLog log;
-    traceEntryNoThrow("~ZebBuffer");
-    logPrintfNoThrow("Freeing %s\n", "buffer");
-    traceExitNoThrow("~ZebBuffer");
+    const FunctionTrace trace(std::nothrow, "~ZebBuffer");
+    trace.log("Freeing\n");
+    trace.exit();
     EXPECT_EQ(log.refusals(), 3);
+}
+
+TEST(FunctionTrace, LogsItsEntryAndWhatItIsToldButNoExitOfItsOwn) {
+    const LogCapture log;
+    {
+        const FunctionTrace trace("sense");
+        trace.log("Getting 100% of it\n");
+    }
+    EXPECT_EQ(log.text(), "Entered Function sense Line #\nGetting 100% of it\n");
+}
+
+TEST(FunctionTrace, LogsTheExitBeforeItThrows) {
+    const LogCapture log;
+    const int line = __LINE__;
+    const FunctionTrace trace("lookup");
+    EXPECT_EQ(messageOf<NotFoundEx>([&] { trace.fail<NotFoundEx>("Element not found\n"); }),
+              "Element not found\n");
+    EXPECT_EQ(log.exactText(), "Entered Function lookup Line " + std::to_string(line + 1) +
+                                   "\nLeft Function lookup Line " + std::to_string(line + 2) + "\n");
+}
+
+TEST(FunctionTrace, LogsALastLineBeforeTheExit) {
+    const LogCapture log;
+    const FunctionTrace trace("lookup");
+    EXPECT_EQ(messageOf<InvalidEx>([&] { trace.logAndFail<InvalidEx>("No %s here\n"); }), "No %s here\n");
+    EXPECT_EQ(messageOf<InvalidEx>([&] { trace.logAndFail<InvalidEx>("Too short\n", "Invalid\n"); }),
+              "Invalid\n");
+    EXPECT_EQ(log.text(), "Entered Function lookup Line #\nNo %s here\nLeft Function lookup Line #\n"
+                          "Too short\nLeft Function lookup Line #\n");
+}
+
+TEST(FunctionTrace, TravelsAsWriteFailedExWhenTheStreamRefusesIt) {
+    EXPECT_EQ(messageOf<WriteFailedEx>([] {
+                  const RefusingLog log;
+                  const FunctionTrace trace("main");
+              }),
+              kRefused);
+    const RefusingLog log(1);
+    const FunctionTrace trace("main");
+    EXPECT_EQ(messageOf<WriteFailedEx>([&] { trace.log("line\n"); }), kRefused);
+    EXPECT_EQ(messageOf<WriteFailedEx>([&] { trace.exit(); }), kRefused);
+    EXPECT_EQ(messageOf<WriteFailedEx>([&] { trace.fail<NotFoundEx>("Element not found\n"); }), kRefused);
 }
 
 } // namespace

@@ -10,8 +10,9 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "foundation/assertion.hpp"
 #include "foundation/exceptions.hpp"
-#include "foundation/trace.hpp"
+#include "foundation/log.hpp"
 
 ScriptedHost gHost;
 

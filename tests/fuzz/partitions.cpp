@@ -1,6 +1,6 @@
 // The lines of /proc/partitions. The input is the file.
 #include "host/logical_tree.hpp"
-#include "main/run_state.hpp"
+#include "main/shared/run_state.hpp"
 #include "tests/fuzz/harness.hpp"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8* data, std::size_t size) {

@@ -1,9 +1,9 @@
 // The choice of a LUN's identifier, and the vendor line before it, on a device that answers each command as
 // it likes. The input is the request flag's byte (modulo 3: FC, DAS, iSCSI) and the answers, command by
 // command, as scripted_device.hpp has them.
-#include "fc/unique_lun_id.hpp"
+#include "fc/identity/unique_lun_id.hpp"
 
-#include "main/run_state.hpp"
+#include "main/shared/run_state.hpp"
 #include "tests/fuzz/scripted_device.hpp"
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8* data, std::size_t size) {

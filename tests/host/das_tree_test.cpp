@@ -7,10 +7,10 @@
 #include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
-#include "main/device_register.hpp"
-#include "main/run_state.hpp"
-#include "tests/host/host_files.hpp"
+#include "main/shared/device_register.hpp"
+#include "main/shared/run_state.hpp"
 #include "tests/support/fake_identity.hpp"
+#include "tests/support/host_files.hpp"
 #include "tests/support/log_capture.hpp"
 #include "tests/support/thrown.hpp"
 

@@ -6,13 +6,14 @@
 #include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
-#include "main/device_register.hpp"
-#include "main/iscsi_model.hpp"
-#include "main/run_state.hpp"
+#include "host/iscsi_listing.hpp"
+#include "main/shared/device_register.hpp"
+#include "main/shared/iscsi_model.hpp"
+#include "main/shared/run_state.hpp"
 #include "scsi/scsi_exceptions.hpp"
-#include "tests/host/host_files.hpp"
 #include "tests/support/fake_commands.hpp"
 #include "tests/support/fake_identity.hpp"
+#include "tests/support/host_files.hpp"
 #include "tests/support/log_capture.hpp"
 #include "tests/support/refusing_log.hpp"
 #include "tests/support/thrown.hpp"
@@ -63,36 +64,27 @@ protected:
     IscsiTree() {
         const LogCapture log;
         DevMap.clear();
-        gIscsiPortList.clear();
-        gIscsiPortMap.clear();
-        // The parser's state as it is at start-up.
         gHostName = mHostName;
-        readInitiatorIQN();
-        feed("Current Portal:\n");
-        feed("Target:\n");
         mFiles.file(kInitiatorFile, std::string("InitiatorName=") + kInitiator + "\n");
-        readInitiatorIQN();
-        std::string("hostA").copy(mHostName, sizeof mHostName - 1);
+        mListing.readInitiatorIQN();
     }
 
     void TearDown() override {
-        gIscsiPortList.clear();
-        gIscsiPortMap.clear();
         DevMap.clear();
         gHostName = nullptr;
     }
 
-    static void feed(std::string line) { processCmdOutput(line.data()); }
+    void feed(std::string line) { mListing.processCmdOutput(line.data()); }
 
-    static std::string logOf(const std::string& line) {
+    std::string logOf(const std::string& line) {
         const LogCapture log;
         feed(line);
         return log.text();
     }
 
     // A session up to its device list.
-    static void startSession(const std::string& interfaceAddress = "192.168.1.5",
-                             const std::string& interfaceMac = "<empty>") {
+    void startSession(const std::string& interfaceAddress = "192.168.1.5",
+                      const std::string& interfaceMac = "<empty>") {
         const LogCapture log;
         feed(std::string("Target: ") + kTarget + " (non-flash)\n");
         feed("\tCurrent Portal: 192.168.1.10:3260,1\n");
@@ -102,7 +94,7 @@ protected:
     }
 
     // The log of the disk line and the one of its LUN before it.
-    static std::string addDisk(const std::string& disk, const std::string& lun) {
+    std::string addDisk(const std::string& disk, const std::string& lun) {
         const LogCapture log;
         feed("\t\tscsi2 Channel 00 Id 0 Lun: " + lun + "\n");
         feed("\t\t\tAttached scsi disk " + disk + "\t\tState: running\n");
@@ -119,10 +111,11 @@ protected:
                        "Disk name '/dev/" + disk + "'\n");
     }
 
-    char mHostName[kHostNameSize] = "";
+    char mHostName[kHostNameSize] = "hostA";
     HostFiles mFiles;
     FakeCommands mCommands;
     FakeIdentity mIdentity;
+    IscsiListing mListing;
 };
 
 TEST_F(IscsiTree, TakesTheTargetWithoutTheRemarkBehindIt) {
@@ -217,8 +210,9 @@ TEST_F(IscsiTree, AddsADiskOfTheSession) {
     EXPECT_EQ(mIdentity.questions(), std::vector<std::string>{"identifier /dev/sdb 4"});
     const LogCapture quiet;
     EXPECT_EQ(getDeviceType("/dev/sdb"), TREE_ISCSI);
-    ASSERT_EQ(gIscsiPortList.size(), 1U);
-    const IscsiInitiatorPort& port = *gIscsiPortList.front();
+    const IscsiPorts::List ports = mListing.takePorts();
+    ASSERT_EQ(ports.size(), 1U);
+    const IscsiInitiatorPort& port = *ports.front();
     EXPECT_STREQ(port.init_wwnn.c_str(), kInitiator);
     EXPECT_STREQ(port.init_wwpn.c_str(), "192.168.1.5");
     ASSERT_EQ(port.paths.size(), 1U);
@@ -234,7 +228,6 @@ TEST_F(IscsiTree, AddsADiskOfTheSession) {
     for (const uint32 unused : path.mUnusedAfter) {
         EXPECT_EQ(unused, 0U);
     }
-    EXPECT_EQ(gIscsiPortMap.size(), 1U);
 }
 
 TEST_F(IscsiTree, TakesTheMacWithoutAnAddress) {
@@ -245,7 +238,8 @@ TEST_F(IscsiTree, TakesTheMacWithoutAnAddress) {
 TEST_F(IscsiTree, TakesTheInitiatorForThePortWhenBothAddressesAreEmptyMarks) {
     startSession("<empty>", "<empty>");
     EXPECT_EQ(addDisk("sdb", "0"), diskLog("sdb", "0", std::string(kInitiator) + ":0"));
-    EXPECT_EQ(gIscsiPortList.size(), 1U);
+    const IscsiPorts::List ports = mListing.takePorts();
+    EXPECT_EQ(ports.size(), 1U);
 }
 
 TEST_F(IscsiTree, TakesTheInitiatorForThePortOfAnAddressOfZeros) {
@@ -262,8 +256,9 @@ TEST_F(IscsiTree, GivesTwoDisksOfOneInterfaceOnePort) {
     startSession();
     addDisk("sdb", "0");
     addDisk("sdc", "1");
-    ASSERT_EQ(gIscsiPortList.size(), 1U);
-    EXPECT_EQ(gIscsiPortList.front()->paths.size(), 2U);
+    const IscsiPorts::List ports = mListing.takePorts();
+    ASSERT_EQ(ports.size(), 1U);
+    EXPECT_EQ(ports.front()->paths.size(), 2U);
 }
 
 TEST_F(IscsiTree, GivesEachInterfaceItsPort) {
@@ -273,10 +268,11 @@ TEST_F(IscsiTree, GivesEachInterfaceItsPort) {
     addDisk("sdc", "0");
     startSession("192.168.2.5");
     addDisk("sdd", "0");
-    ASSERT_EQ(gIscsiPortList.size(), 2U);
-    EXPECT_STREQ(gIscsiPortList.front()->init_wwpn.c_str(), "192.168.2.5");
-    EXPECT_EQ(gIscsiPortList.front()->paths.size(), 2U);
-    EXPECT_STREQ(gIscsiPortList.back()->init_wwpn.c_str(), "192.168.1.5");
+    const IscsiPorts::List ports = mListing.takePorts();
+    ASSERT_EQ(ports.size(), 2U);
+    EXPECT_STREQ(ports.front()->init_wwpn.c_str(), "192.168.2.5");
+    EXPECT_EQ(ports.front()->paths.size(), 2U);
+    EXPECT_STREQ(ports.back()->init_wwpn.c_str(), "192.168.1.5");
 }
 
 TEST_F(IscsiTree, ClaimsButIgnoresADiskBeforeItsLun) {
@@ -287,7 +283,8 @@ TEST_F(IscsiTree, ClaimsButIgnoresADiskBeforeItsLun) {
                                  registerLog(kInitiator, "192.168.1.5", kTarget, "192.168.1.10", "-1") +
                                  ignoringLog("/dev/sdb")) +
                       "Disk name '/dev/sdb'\n"));
-    EXPECT_TRUE(gIscsiPortList.empty());
+    const IscsiPorts::List ports = mListing.takePorts();
+    EXPECT_TRUE(ports.empty());
     const LogCapture quiet;
     EXPECT_EQ(getDeviceType("/dev/sdb"), TREE_ISCSI);
 }
@@ -367,7 +364,7 @@ TEST_F(IscsiTree, IgnoresADiskOfAnInitiatorThatIsAnEmptyMark) {
     {
         const LogCapture log;
         mFiles.file(kInitiatorFile, "InitiatorName=<empty>\n");
-        readInitiatorIQN();
+        mListing.readInitiatorIQN();
     }
     startSession();
     EXPECT_EQ(addDisk("sdb", "0"),
@@ -393,8 +390,9 @@ TEST_F(IscsiTree, KeepsADiskWhoseIdentifierCannotBeRead) {
     startSession();
     mIdentity.identifier("/dev/sdb", throws<TimeOutEx>());
     EXPECT_EQ(addDisk("sdb", "0"), diskLog("sdb", "0", "192.168.1.5"));
-    ASSERT_EQ(gIscsiPortList.size(), 1U);
-    EXPECT_STREQ(gIscsiPortList.front()->paths.front()->uniqueLunId.c_str(), ":-( SCSI_Inquiry_Failed");
+    const IscsiPorts::List ports = mListing.takePorts();
+    ASSERT_EQ(ports.size(), 1U);
+    EXPECT_STREQ(ports.front()->paths.front()->uniqueLunId.c_str(), ":-( SCSI_Inquiry_Failed");
 }
 
 TEST_F(IscsiTree, CutsADiskPathAt127Characters) {
@@ -412,9 +410,10 @@ TEST_F(IscsiTree, KeepsAtMost255CharactersOfADeviceName) {
     startSession();
     const LogCapture log;
     feed("scsi2 Lun: 0\n");
-    addIscsiPath(std::string(300, 'd').c_str());
-    ASSERT_EQ(gIscsiPortList.size(), 1U);
-    EXPECT_EQ(gIscsiPortList.front()->paths.front()->deviceName, std::string(255, 'd'));
+    mListing.addIscsiPath(std::string(300, 'd').c_str());
+    const IscsiPorts::List ports = mListing.takePorts();
+    ASSERT_EQ(ports.size(), 1U);
+    EXPECT_EQ(ports.front()->paths.front()->deviceName, std::string(255, 'd'));
 }
 
 TEST_F(IscsiTree, TakesADiskNameRightBehindItsKey) {
@@ -433,7 +432,7 @@ TEST_F(IscsiTree, ReadsTheInitiatorFromTheFirstMatchingLine) {
     mFiles.file(kInitiatorFile, "## DO NOT EDIT\n#InitiatorName=iqn.comment\nInitiatorAlias=x\n"
                                 " \tInitiatorName=iqn.first # mine\nInitiatorName=iqn.second\n");
     const LogCapture log;
-    EXPECT_EQ(readInitiatorIQN(), 0U);
+    EXPECT_EQ(mListing.readInitiatorIQN(), 0U);
     EXPECT_EQ(log.text(), traced("readInitiatorIQN", "InitiatorIQN iqn.first\n"));
 }
 
@@ -441,7 +440,7 @@ TEST_F(IscsiTree, ReadsALongInitiatorWhole) {
     const std::string name(5000, 'n');
     mFiles.file(kInitiatorFile, std::string(3000, '#') + "\nInitiatorName=" + name);
     const LogCapture log;
-    EXPECT_EQ(readInitiatorIQN(), 0U);
+    EXPECT_EQ(mListing.readInitiatorIQN(), 0U);
     EXPECT_EQ(log.text(), traced("readInitiatorIQN", "InitiatorIQN " + name + "\n"));
 }
 
@@ -449,7 +448,7 @@ TEST_F(IscsiTree, TakesTheHostsNameForAnEmptyInitiator) {
     mFiles.file(kInitiatorFile, "InitiatorName= iqn.behind-a-blank\n");
     {
         const LogCapture log;
-        EXPECT_EQ(readInitiatorIQN(), 0U);
+        EXPECT_EQ(mListing.readInitiatorIQN(), 0U);
         EXPECT_EQ(log.text(),
                   traced("readInitiatorIQN", "InitiatorIQN \n"
                                              "Failed to find the Initiator IQN, using hostname!\n"));
@@ -461,21 +460,16 @@ TEST_F(IscsiTree, TakesTheHostsNameForAnEmptyInitiator) {
 TEST_F(IscsiTree, KeepsTheInitiatorItHasWhenTheFileNamesNone) {
     mFiles.file(kInitiatorFile, "# nothing\n");
     const LogCapture log;
-    EXPECT_EQ(readInitiatorIQN(), 0U);
+    EXPECT_EQ(mListing.readInitiatorIQN(), 0U);
     EXPECT_EQ(log.text(), traced("readInitiatorIQN", ""));
 }
 
 class IscsiTreeWithoutInitiator : public testing::Test {
 protected:
-    IscsiTreeWithoutInitiator() {
-        gHostName = mNoName;
-        const LogCapture log;
-        readInitiatorIQN();
-        gHostName = mHostName;
-    }
+    IscsiTreeWithoutInitiator() { gHostName = mHostName; }
     void TearDown() override { gHostName = nullptr; }
 
-    char mNoName[kHostNameSize] = "";
+    IscsiListing mListing;
     char mHostName[kHostNameSize] = "hostA";
     HostFiles mFiles;
     FakeCommands mCommands;
@@ -484,13 +478,13 @@ protected:
 TEST_F(IscsiTreeWithoutInitiator, TakesTheHostsNameWhenTheFileNamesNone) {
     mFiles.file(kInitiatorFile, "");
     const LogCapture log;
-    EXPECT_EQ(readInitiatorIQN(), 0U);
+    EXPECT_EQ(mListing.readInitiatorIQN(), 0U);
     EXPECT_EQ(log.text(), traced("readInitiatorIQN", "Failed to find the Initiator IQN, using hostname!\n"));
 }
 
 TEST_F(IscsiTreeWithoutInitiator, FailsWithoutItsFile) {
     const LogCapture log;
-    EXPECT_EQ(readInitiatorIQN(), 5U);
+    EXPECT_EQ(mListing.readInitiatorIQN(), 5U);
     EXPECT_EQ(log.text(), "Entered Function readInitiatorIQN Line #\n"
                           "Failed to open /etc/iscsi/initiatorname.iscsi!\n");
 }
@@ -560,7 +554,6 @@ TEST_F(IscsiTree, IsBuiltAndPrintedFromTheListing) {
                            ":-( SCSI_Inquiry_Failed")));
     EXPECT_EQ(FakeCommands::openStreams(), 0U);
     EXPECT_TRUE(gIscsiPortList.empty());
-    EXPECT_TRUE(gIscsiPortMap.empty());
 }
 
 TEST_F(IscsiTree, EndsAtAReadErrorOfTheListing) {
@@ -573,9 +566,10 @@ TEST_F(IscsiTree, EndsAtAReadErrorOfTheListing) {
 
 TEST_F(IscsiTree, LetsALogThatIsFullOut) {
     const RefusingLog log;
-    EXPECT_EQ(messageOf<WriteFailedEx>([] { readInitiatorIQN(); }), "File write failed\n");
+    EXPECT_EQ(messageOf<WriteFailedEx>([&] { mListing.readInitiatorIQN(); }), "File write failed\n");
     std::string line = "Target: iqn.a\n";
-    EXPECT_EQ(messageOf<WriteFailedEx>([&] { processCmdOutput(line.data()); }), "File write failed\n");
+    EXPECT_EQ(messageOf<WriteFailedEx>([&] { mListing.processCmdOutput(line.data()); }),
+              "File write failed\n");
 }
 
 // The two text routines.

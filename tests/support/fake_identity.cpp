@@ -2,7 +2,9 @@
 
 #include <cstdlib>
 
-#include "fc/unique_lun_id.hpp"
+#include "fc/identity/unique_lun_id.hpp"
+
+bool gDirectAttachedFlag = false;
 
 namespace {
 

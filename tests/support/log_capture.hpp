@@ -5,7 +5,7 @@
 #include <cstdlib>
 #include <string>
 
-#include "foundation/trace.hpp"
+#include "foundation/log.hpp"
 
 // The text with '#' for the line number of every trace line, for those of the numbers that are the source's
 // own and change with it.

@@ -4,7 +4,7 @@
 #include <cerrno>
 #include <cstdio>
 
-#include "foundation/trace.hpp"
+#include "foundation/log.hpp"
 
 // Stands in for the log while it lives: takes the first `accepted` writes and refuses every later one.
 class RefusingLog {

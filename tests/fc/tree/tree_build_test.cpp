@@ -8,8 +8,8 @@
 #include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
-#include "main/device_register.hpp"
-#include "main/run_state.hpp"
+#include "main/shared/device_register.hpp"
+#include "main/shared/run_state.hpp"
 #include "scsi/scsi_exceptions.hpp"
 #include "tests/support/fake_commands.hpp"
 #include "tests/support/fake_hba.hpp"

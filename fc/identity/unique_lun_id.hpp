@@ -5,6 +5,10 @@
 #include "foundation/zeb_string.hpp"
 #include "scsi/inquiry.hpp"
 
+// Set by HA_GetScsiUniqueLunId when it accepts a device of the DAS tree without an identifier; read and
+// cleared by the report of that device.
+extern bool gDirectAttachedFlag;
+
 // Reads the unique identifier of the device `deviceName` (a node's path; what follows a ';' is left out) into
 // `identifier`: the designator of VPD page 83h that ranks first (NAA, T10 vendor id, EUI-64, SCSI name, MD5),
 // or, without one, a text made of standard INQUIRY data. `requestFlag` is the tree that asks: a device of the

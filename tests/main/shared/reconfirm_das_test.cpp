@@ -1,10 +1,10 @@
-#include "host/reconfirm_das.hpp"
+#include "main/shared/reconfirm_das.hpp"
 
 #include <string>
 
 #include <gtest/gtest.h>
 
-#include "tests/host/host_files.hpp"
+#include "tests/support/host_files.hpp"
 #include "tests/support/log_capture.hpp"
 
 namespace {

@@ -1,4 +1,4 @@
-#include "main/device_report.hpp"
+#include "main/shared/device_report.hpp"
 
 #include <new>
 #include <string>
@@ -6,10 +6,11 @@
 
 #include <gtest/gtest.h>
 
+#include "fc/identity/unique_lun_id.hpp"
 #include "foundation/exceptions.hpp"
-#include "main/device_register.hpp"
-#include "main/iscsi_model.hpp"
-#include "main/run_state.hpp"
+#include "main/shared/device_register.hpp"
+#include "main/shared/iscsi_model.hpp"
+#include "main/shared/run_state.hpp"
 #include "scsi/scsi_exceptions.hpp"
 #include "tests/support/fake_identity.hpp"
 #include "tests/support/log_capture.hpp"

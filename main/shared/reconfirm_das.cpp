@@ -1,4 +1,4 @@
-#include "host/reconfirm_das.hpp"
+#include "main/shared/reconfirm_das.hpp"
 
 #include <dirent.h>
 #include <unistd.h>
@@ -9,9 +9,10 @@
 
 #include "foundation/clib_memory.hpp"
 #include "foundation/clib_stream.hpp"
+#include "foundation/directory.hpp"
 #include "foundation/exceptions.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
-#include "host/directory.hpp"
 
 namespace {
 
@@ -36,7 +37,7 @@ Text zeroedText() {
 } // namespace
 
 uint32 reconfirmDAS(const ZebString& devName) {
-    TRACE_ENTRY("reconfirmDAS");
+    const FunctionTrace trace("reconfirmDAS");
     const Text path = zeroedText();
     const Text target = zeroedText();
     const ZebString rest = devName.substr(sizeof "/dev" - 1, ZebString::npos);
@@ -55,15 +56,15 @@ uint32 reconfirmDAS(const ZebString& devName) {
     Clib_snprintf(path.get(), kPathLimit, "/sys/block/%s/%s", rest.c_str(), target.get());
     const Directory directory(path.get());
     if (!directory.isOpen()) {
-        Clib_fprintf(gLogStream, "Failed to open path '%s'", path.get());
+        reportPrintf("Failed to open path '%s'", path.get());
         return kIsDas;
     }
     while (const dirent* const entry = directory.next()) {
-        Clib_fprintf(gLogStream, "Entry name %s\n", entry->d_name);
+        reportPrintf("Entry name %s\n", entry->d_name);
         if (Clib_strncmp(entry->d_name, "fc_transport", sizeof "fc_transport" - 1) == 0) {
             return kHasFcTransport;
         }
     }
-    TRACE_EXIT("reconfirmDAS");
+    trace.exit();
     return kIsDas;
 }

@@ -4,7 +4,6 @@
 #include "foundation/counted_pointer.hpp"
 #include "foundation/integers.hpp"
 #include "foundation/list.hpp"
-#include "foundation/map.hpp"
 #include "foundation/zeb_string.hpp"
 
 // One attached disk behind one initiator port.
@@ -26,5 +25,7 @@ struct IscsiInitiatorPort {
     ZebList<ZebCountedPointer<IscsiLunPath>>::List paths;
 };
 
-extern ZebList<ZebCountedPointer<IscsiInitiatorPort>>::List gIscsiPortList;    // the print order
-extern ZebStringMap<ZebCountedPointer<IscsiInitiatorPort>>::Map gIscsiPortMap; // init_wwpn -> the same ports
+using IscsiPorts = ZebList<ZebCountedPointer<IscsiInitiatorPort>>;
+
+// The ports that the report prints, in this order; the iSCSI tree fills it for the report and empties it.
+extern IscsiPorts::List gIscsiPortList;

@@ -1,14 +1,15 @@
-#include "fc/unique_lun_id.hpp"
+#include "fc/identity/unique_lun_id.hpp"
 
 #include <exception>
 #include <new>
 
-#include "foundation/clib_stream.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
-#include "main/run_state.hpp"
 #include "scsi/io_handler_linux.hpp"
 #include "scsi/response_bytes.hpp"
 #include "scsi/scsi_exceptions.hpp"
+
+bool gDirectAttachedFlag = false;
 
 namespace {
 
@@ -18,18 +19,18 @@ constexpr uint32 kDirectAttachedRequest = 2;
 // The handler and the inquiry that all calls of a run share, made at the first.
 ZebScsiInquiry::Handler& sharedHandler() {
     static ZebScsiInquiry::Handler sHandler = [] {
-        ZebScsiInquiry::Handler lHandler;
-        lHandler.create(new (std::nothrow) ZebScsiIoHandlerLinux, ZebPST_Individual, ZebPAT_New);
-        return lHandler;
+        ZebScsiInquiry::Handler handler;
+        handler.create(new (std::nothrow) ZebScsiIoHandlerLinux, ZebPST_Individual, ZebPAT_New);
+        return handler;
     }();
     return sHandler;
 }
 
 ZebScsiInquiry& sharedInquiry() {
     static ZebCountedPointer<ZebScsiInquiry> sInquiry = [] {
-        ZebCountedPointer<ZebScsiInquiry> lInquiry;
-        lInquiry.create(new (std::nothrow) ZebScsiInquiry, ZebPST_Individual, ZebPAT_New);
-        return lInquiry;
+        ZebCountedPointer<ZebScsiInquiry> inquiry;
+        inquiry.create(new (std::nothrow) ZebScsiInquiry, ZebPST_Individual, ZebPAT_New);
+        return inquiry;
     }();
     return *sInquiry;
 }
@@ -47,9 +48,9 @@ public:
 
     // Throws CloseFailedEx; the node counts as closed then too.
     void close() {
-        const int32 lFd = mFd;
+        const int32 fd = mFd;
         leaveOpen();
-        sharedHandler()->close(lFd);
+        sharedHandler()->close(fd);
     }
 
     // For paths on which an exception travels that says more than a failure to close.
@@ -71,14 +72,14 @@ private:
 };
 
 ZebString withoutTrailingBlanks(const ZebString& text) {
-    const ZebString::size_type lLast = text.find_last_not_of(" ");
-    return lLast == ZebString::npos ? ZebString("") : text.substr(0, lLast + 1);
+    const ZebString::size_type last = text.find_last_not_of(" ");
+    return last == ZebString::npos ? ZebString("") : text.substr(0, last + 1);
 }
 
 // The node's path: the device name up to its first ';'.
 ZebString devicePath(const ZebString& deviceName) {
-    const ZebString::size_type lSemicolon = deviceName.find_first_of(';');
-    return lSemicolon == ZebString::npos ? deviceName : deviceName.substr(0, lSemicolon);
+    const ZebString::size_type semicolon = deviceName.find_first_of(';');
+    return semicolon == ZebString::npos ? deviceName : deviceName.substr(0, semicolon);
 }
 
 bool contains(const ZebString& text, const char* part) {
@@ -133,37 +134,37 @@ void walkDesignators(const ZebScsiInquiry::Response& page, Designators& designat
     enum DesignatorType : uint32 { kT10VendorId = 1, kEui64 = 2, kNaa = 3, kMd5 = 7, kScsiName = 8 };
     constexpr uint32 kFirstReservedType = 10;
     constexpr uint32 kLogicalUnit = 0;
-    uint32 lOffset = 0;
+    uint32 offset = 0;
     while (!designators.isFound) {
-        uint32 lType = 0;
-        uint32 lAssociation = 0;
-        ZebString lRawText("");
-        sharedInquiry().getDiPageIdentifierAscii(page, lOffset, lType, lAssociation, lRawText);
-        if (lAssociation != kLogicalUnit || lType >= kFirstReservedType) {
+        uint32 type = 0;
+        uint32 association = 0;
+        ZebString rawText("");
+        sharedInquiry().getDiPageIdentifierAscii(page, offset, type, association, rawText);
+        if (association != kLogicalUnit || type >= kFirstReservedType) {
             continue;
         }
-        const ZebString lText = withoutTrailingBlanks(lRawText);
-        switch (lType) {
+        const ZebString text = withoutTrailingBlanks(rawText);
+        switch (type) {
         case kT10VendorId:
-            store(designators.t10, lText, designators);
-            logPrintf("Found T10 Id: %s \n", lText.c_str());
+            store(designators.t10, text, designators);
+            logPrintf("Found T10 Id: %s \n", text.c_str());
             break;
         case kEui64:
-            store(designators.eui64, lText, designators);
-            logPrintf("Found Eui64Id: %s \n", lText.c_str());
+            store(designators.eui64, text, designators);
+            logPrintf("Found Eui64Id: %s \n", text.c_str());
             break;
         case kNaa:
-            store(identifier, lText, designators);
+            store(identifier, text, designators);
             designators.isFound = true;
-            logPrintf("Found NaaId: %s \n", lText.c_str());
+            logPrintf("Found NaaId: %s \n", text.c_str());
             break;
         case kMd5:
-            store(designators.md5, lText, designators);
-            logPrintf("Found MD5ID: %s \n", lText.c_str());
+            store(designators.md5, text, designators);
+            logPrintf("Found MD5ID: %s \n", text.c_str());
             break;
         case kScsiName:
-            store(designators.scsiName, lText, designators);
-            logPrintf("Found ScsiName ID: %s \n", lText.c_str());
+            store(designators.scsiName, text, designators);
+            logPrintf("Found ScsiName ID: %s \n", text.c_str());
             break;
         default:
             logPrintf("Default ID recieved");
@@ -204,10 +205,10 @@ void choosePreferred(Designators& designators, ZebString& identifier) {
     if (designators.isFound || designators.firstSeen.empty()) {
         return;
     }
-    for (const ZebString* lCandidate :
+    for (const ZebString* candidate :
          {&designators.t10, &designators.eui64, &designators.scsiName, &designators.md5}) {
-        if (!lCandidate->empty()) {
-            identifier = *lCandidate;
+        if (!candidate->empty()) {
+            identifier = *candidate;
             break;
         }
     }
@@ -242,48 +243,47 @@ ZebString rawPageIdentifier(const ZebScsiInquiry::Response& page) {
 ZebString identifierFromStdInquiry(int32 fd, const Designators& designators,
                                    const ZebScsiInquiry::Response& page,
                                    ZebScsiInquiry::Response& stdResponse) {
-    ZebScsiInquiry& lInquiry = sharedInquiry();
-    lInquiry.doStandardInquiry(fd, sharedHandler(), kTimeOutMs, stdResponse);
-    ZebString lVendor("");
-    sGetStdInqField(lInquiry, stdResponse, VendorId, lVendor);
-    logPrintf("InqBuffer %p Vendor %s \n", static_cast<const void*>(stdResponse.get()), lVendor.c_str());
-    if (lVendor == "NETAPP" && designators.isPageNotSupported) {
+    ZebScsiInquiry& inquiry = sharedInquiry();
+    inquiry.doStandardInquiry(fd, sharedHandler(), kTimeOutMs, stdResponse);
+    ZebString vendor("");
+    sGetStdInqField(inquiry, stdResponse, VendorId, vendor);
+    logPrintf("InqBuffer %p Vendor %s \n", static_cast<const void*>(stdResponse.get()), vendor.c_str());
+    if (vendor == "NETAPP" && designators.isPageNotSupported) {
         throw ExpiredEx("Netapp device has expired\n");
     }
-    if (lVendor == "EMC") {
+    if (vendor == "EMC") {
         return rawPageIdentifier(page);
     }
-    ZebString lIdentifier(lVendor);
-    for (const uint32 lField : {ProductId, ProductRevision, UndocumentedId}) {
-        ZebString lText("");
-        sGetStdInqField(lInquiry, stdResponse, lField, lText);
-        lIdentifier += ":";
-        lIdentifier += lText;
+    ZebString identifier(vendor);
+    for (const uint32 field : {ProductId, ProductRevision, UndocumentedId}) {
+        ZebString text("");
+        sGetStdInqField(inquiry, stdResponse, field, text);
+        identifier += ":";
+        identifier += text;
     }
-    return lIdentifier;
+    return identifier;
 }
 
-// Opens the node for one of the two functions below, whose trace name is `caller`. Throws NotFoundEx.
-int32 openForInquiry(const ZebString& path, const char* caller) {
-    int32 lFd = -1;
+// Opens the node for the function that `trace` is of. Throws NotFoundEx.
+int32 openForInquiry(const ZebString& path, const FunctionTrace& trace) {
+    int32 fd = -1;
     try {
-        sharedHandler()->open(path, lFd);
+        sharedHandler()->open(path, fd);
     } catch (const OpenFailedEx& exception) {
         logPrintf("Cannot do Scsi Inquiry on %s - %s\n", path.c_str(), exception.what());
-        TRACE_EXIT(caller);
-        throw NotFoundEx("Cannot open device for Scsi Inquiry\n");
+        trace.fail<NotFoundEx>("Cannot open device for Scsi Inquiry\n");
     }
-    return lFd;
+    return fd;
 }
 
-// Logs the standard-INQUIRY failure that is being handled, closes the device and leaves `caller`, which
-// throws the failure on. An expired device stays open.
-void leaveAfterStdInquiryFailure(OpenDevice& device, const char* caller) {
-    const char* const lLine = stdInquiryFailureLine();
-    if (lLine != nullptr) {
-        logPrintf("%s", lLine);
+// Logs the standard-INQUIRY failure that is being handled, closes the device and leaves the function that
+// `trace` is of, which throws the failure on. An expired device stays open.
+void leaveAfterStdInquiryFailure(OpenDevice& device, const FunctionTrace& trace) {
+    const char* const line = stdInquiryFailureLine();
+    if (line != nullptr) {
+        logPrintf("%s", line);
         device.closeQuietly();
-        TRACE_EXIT(caller);
+        trace.exit();
     }
 }
 
@@ -291,105 +291,99 @@ void leaveAfterStdInquiryFailure(OpenDevice& device, const char* caller) {
 
 void sGetStdInqField(ZebScsiInquiry& inquiry, const ZebScsiInquiry::Response& response, uint32 fieldIndex,
                      ZebString& fieldOut) {
-    TRACE_ENTRY("sGetStdInqField");
-    ZebString lText("");
-    inquiry.getInquiryFieldAscii(response, fieldIndex, lText);
-    fieldOut = withoutTrailingBlanks(lText);
-    TRACE_EXIT("sGetStdInqField");
+    const FunctionTrace trace("sGetStdInqField");
+    ZebString text("");
+    inquiry.getInquiryFieldAscii(response, fieldIndex, text);
+    fieldOut = withoutTrailingBlanks(text);
+    trace.exit();
 }
 
 void HA_GetScsiUniqueLunId(const ZebString& deviceName, ZebString& identifier, uint32& requestFlag) {
-    TRACE_ENTRY("HA_GetScsiUniqueLunId");
-    const ZebString lPath = devicePath(deviceName);
-    if (contains(lPath, "/sg")) {
-        TRACE_EXIT("HA_GetScsiUniqueLunId");
-        throw NotSupportedEx("The /sg? device is not supported");
+    const FunctionTrace trace("HA_GetScsiUniqueLunId");
+    const ZebString path = devicePath(deviceName);
+    if (contains(path, "/sg")) {
+        trace.fail<NotSupportedEx>("The /sg? device is not supported");
     }
-    OpenDevice lDevice(openForInquiry(lPath, "HA_GetScsiUniqueLunId"));
+    OpenDevice device(openForInquiry(path, trace));
 
-    ZebScsiInquiry::Response lPage;
-    ZebScsiInquiry::Response lStdResponse;
-    if (!isDeviceAccepted(lDevice, requestFlag, lStdResponse)) {
+    ZebScsiInquiry::Response page;
+    ZebScsiInquiry::Response stdResponse;
+    if (!isDeviceAccepted(device, requestFlag, stdResponse)) {
         try {
-            lDevice.close();
+            device.close();
         } catch (const CloseFailedEx&) {
             logPrintf("Failed to close device handle opened for scsi inquiry");
         }
-        TRACE_EXIT("HA_GetScsiUniqueLunId");
-        throw NotSupportedEx("Device type not supported");
+        trace.fail<NotSupportedEx>("Device type not supported");
     }
 
     logPrintf("Get LunID\n");
-    Designators lDesignators;
-    readDesignators(lDevice.fd(), lPage, lDesignators, identifier);
-    choosePreferred(lDesignators, identifier);
-    if (lDesignators.isFound) {
-        logPrintf("Old Unique LunId = %s, New Unique LunId = %s\n", lDesignators.firstSeen.c_str(),
+    Designators designators;
+    readDesignators(device.fd(), page, designators, identifier);
+    choosePreferred(designators, identifier);
+    if (designators.isFound) {
+        logPrintf("Old Unique LunId = %s, New Unique LunId = %s\n", designators.firstSeen.c_str(),
                   identifier.c_str());
     } else {
         logPrintf("Could not find UniqueLunId from VPD Page 83, for device %s\n", deviceName.c_str());
     }
-    if (!lDesignators.isFound && requestFlag == kDirectAttachedRequest) {
+    if (!designators.isFound && requestFlag == kDirectAttachedRequest) {
         gDirectAttachedFlag = true;
         identifier = "";
-        lDesignators.isFound = true;
+        designators.isFound = true;
     }
-    if (!lDesignators.isFound && lDesignators.hasScsiFailure) {
-        lDevice.close();
-        logPrintf("Can't get ULID using Scsi\n");
-        TRACE_EXIT("HA_GetScsiUniqueLunId");
-        throw NotFoundEx("Can't get ULID using SCSI\n");
+    if (!designators.isFound && designators.hasScsiFailure) {
+        device.close();
+        trace.logAndFail<NotFoundEx>("Can't get ULID using Scsi\n", "Can't get ULID using SCSI\n");
     }
-    if (lDesignators.isFound) {
-        lDevice.close();
+    if (designators.isFound) {
+        device.close();
         logPrintf("Got ULID\n");
-        TRACE_EXIT("HA_GetScsiUniqueLunId");
+        trace.exit();
         return;
     }
 
     try {
-        identifier = identifierFromStdInquiry(lDevice.fd(), lDesignators, lPage, lStdResponse);
+        identifier = identifierFromStdInquiry(device.fd(), designators, page, stdResponse);
     } catch (const ExpiredEx&) {
-        lDevice.leaveOpen();
-        leaveAfterStdInquiryFailure(lDevice, "HA_GetScsiUniqueLunId");
+        device.leaveOpen();
+        leaveAfterStdInquiryFailure(device, trace);
         throw;
     } catch (const TException&) {
-        leaveAfterStdInquiryFailure(lDevice, "HA_GetScsiUniqueLunId");
+        leaveAfterStdInquiryFailure(device, trace);
         throw;
     }
     logPrintf("UniqueLunId from Standard Inquiry = %s\n", identifier.c_str());
-    lDevice.close();
-    TRACE_EXIT("HA_GetScsiUniqueLunId");
+    device.close();
+    trace.exit();
 }
 
 void HA_PrintVendorProductId(const ZebString& deviceName) {
-    TRACE_ENTRY("HA_PrintVendorProductId");
-    const ZebString lPath = devicePath(deviceName);
-    if (contains(lPath, "/sg")) {
-        TRACE_EXIT("HA_PrintVendorProductId");
-        throw NotSupportedEx("The /sg? device is not supported");
+    const FunctionTrace trace("HA_PrintVendorProductId");
+    const ZebString path = devicePath(deviceName);
+    if (contains(path, "/sg")) {
+        trace.fail<NotSupportedEx>("The /sg? device is not supported");
     }
-    if (contains(lPath, "/dev/hdiskpower")) {
-        TRACE_EXIT("HA_PrintVendorProductId");
-        throw NotSupportedEx("The EMC PowerPath /dev/hdiskpower device is not supported");
+    if (contains(path, "/dev/hdiskpower")) {
+        trace.fail<NotSupportedEx>("The EMC PowerPath /dev/hdiskpower device is not supported");
     }
-    OpenDevice lDevice(openForInquiry(lPath, "HA_PrintVendorProductId"));
-    ZebScsiInquiry::Response lResponse; // lives until the trace has left the function
+    OpenDevice device(openForInquiry(path, trace));
+    ZebScsiInquiry::Response response; // lives until the trace has left the function
     try {
-        ZebScsiInquiry& lInquiry = sharedInquiry();
-        lInquiry.doStandardInquiry(lDevice.fd(), sharedHandler(), kTimeOutMs, lResponse);
-        ZebString lVendor("");
-        ZebString lProduct("");
-        ZebString lRevision("");
-        sGetStdInqField(lInquiry, lResponse, VendorId, lVendor);
-        sGetStdInqField(lInquiry, lResponse, ProductId, lProduct);
-        sGetStdInqField(lInquiry, lResponse, ProductRevision, lRevision);
-        logPrintf("Vendor %s ProductId %s ProductRev %s\n", lVendor.c_str(), lProduct.c_str(),
-                  lRevision.c_str());
+        ZebScsiInquiry& inquiry = sharedInquiry();
+        inquiry.doStandardInquiry(device.fd(), sharedHandler(), kTimeOutMs, response);
+        ZebString vendor("");
+        ZebString product("");
+        ZebString revision("");
+        sGetStdInqField(inquiry, response, VendorId, vendor);
+        sGetStdInqField(inquiry, response, ProductId, product);
+        sGetStdInqField(inquiry, response, ProductRevision, revision);
+        logPrintf("Vendor %s ProductId %s ProductRev %s\n", vendor.c_str(), product.c_str(),
+                  revision.c_str());
     } catch (const TException&) {
-        leaveAfterStdInquiryFailure(lDevice, "HA_PrintVendorProductId");
+        leaveAfterStdInquiryFailure(device, trace);
         throw;
     }
-    lDevice.close();
-    TRACE_EXIT("HA_PrintVendorProductId");
+    device.close();
+    trace.exit();
 }

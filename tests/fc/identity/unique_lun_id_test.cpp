@@ -1,13 +1,13 @@
-#include "fc/unique_lun_id.hpp"
+#include "fc/identity/unique_lun_id.hpp"
 
 #include <cerrno>
 
 #include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
-#include "main/run_state.hpp"
+#include "main/shared/run_state.hpp"
 #include "scsi/scsi_exceptions.hpp"
-#include "tests/fc/unique_lun_id_log.hpp"
+#include "tests/fc/identity/unique_lun_id_log.hpp"
 #include "tests/support/thrown.hpp"
 
 namespace {

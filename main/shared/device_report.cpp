@@ -1,15 +1,16 @@
-#include "main/device_report.hpp"
+#include "main/shared/device_report.hpp"
 
 #include <exception>
 
-#include "fc/unique_lun_id.hpp"
+#include "fc/identity/unique_lun_id.hpp"
 #include "foundation/clib_memory.hpp"
 #include "foundation/clib_stream.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
-#include "host/reconfirm_das.hpp"
-#include "main/device_register.hpp"
-#include "main/iscsi_model.hpp"
-#include "main/run_state.hpp"
+#include "main/shared/device_register.hpp"
+#include "main/shared/iscsi_model.hpp"
+#include "main/shared/reconfirm_das.hpp"
+#include "main/shared/run_state.hpp"
 
 namespace {
 
@@ -27,14 +28,14 @@ ZebString hostNameAnd(const char* separator, const char* devName) {
 }
 
 void printIscsiPath(const IscsiInitiatorPort& port, const IscsiLunPath& path) {
-    Clib_fprintf(gLogStream, "|_ Initiator IQN ");
-    Clib_fprintf(gLogStream, " %s\n", port.init_wwnn.c_str());
-    Clib_fprintf(gLogStream, "|  |_ Target IQN");
-    Clib_fprintf(gLogStream, " %s\n", path.tgt_wwnn.c_str());
-    Clib_fprintf(gLogStream, "|  |  |_ Initiator_IP/MAC <--------> Target_IP\n");
-    Clib_fprintf(gLogStream, "         %s <---> %s\n", port.init_wwpn.c_str(), path.tgt_wwpn.c_str());
-    Clib_fprintf(gLogStream, "|  |  |  |_ Device_Name: %s sScsiOSLun: %d LunId: %s\n\n", path.deviceName,
-                 path.sScsiOSLun, path.uniqueLunId.c_str());
+    reportPrintf("|_ Initiator IQN ");
+    reportPrintf(" %s\n", port.init_wwnn.c_str());
+    reportPrintf("|  |_ Target IQN");
+    reportPrintf(" %s\n", path.tgt_wwnn.c_str());
+    reportPrintf("|  |  |_ Initiator_IP/MAC <--------> Target_IP\n");
+    reportPrintf("         %s <---> %s\n", port.init_wwpn.c_str(), path.tgt_wwpn.c_str());
+    reportPrintf("|  |  |  |_ Device_Name: %s sScsiOSLun: %d LunId: %s\n\n", path.deviceName, path.sScsiOSLun,
+                 path.uniqueLunId.c_str());
 }
 
 void printIscsiTree() {
@@ -43,7 +44,7 @@ void printIscsiTree() {
             logPrintf("No target mappings for port");
             continue;
         }
-        Clib_fprintf(gLogStream, "\n");
+        reportPrintf("\n");
         for (const ZebCountedPointer<IscsiLunPath>& path : port->paths) {
             printIscsiPath(*port, *path);
         }
@@ -64,9 +65,9 @@ void printDasDevice(char* name) {
     try {
         HA_GetScsiUniqueLunId(devName.text, lunId, requestFlag);
     } catch (const std::exception&) {
-        Clib_fprintf(gLogStream, "Exception occured while getting LUN ID for device %s\n", devName.text);
+        reportPrintf("Exception occured while getting LUN ID for device %s\n", devName.text);
         if (!gDirectAttachedFlag) {
-            Clib_fprintf(gLogStream, "\n--------> Device Name: |%s| is not supported\n\n", devName.text);
+            reportPrintf("\n--------> Device Name: |%s| is not supported\n\n", devName.text);
             return;
         }
     }
@@ -75,21 +76,21 @@ void printDasDevice(char* name) {
         gDirectAttachedFlag = false;
     }
     addDeviceNameMap(TREE_DAS, devName.text);
-    Clib_fprintf(gLogStream, "\n--------> Device Name: |%s| LunId: |%s|\n\n", devName.text, lunId.c_str());
+    reportPrintf("\n--------> Device Name: |%s| LunId: |%s|\n\n", devName.text, lunId.c_str());
 }
 
 void printLogicalDevice(const char* name) {
     const DevicePath devName(name);
     if (getDeviceType(devName.text) == 0) {
         const ZebString lunId = hostNameAnd(" :: ", devName.text);
-        Clib_fprintf(gLogStream, "\n--------> Device Name: |%s| LunId: |%s| \n", devName.text, lunId.c_str());
+        reportPrintf("\n--------> Device Name: |%s| LunId: |%s| \n", devName.text, lunId.c_str());
     }
 }
 
 } // namespace
 
 void printDeviceTree(int32 type, char* name) {
-    TRACE_ENTRY("printDeviceTree");
+    const FunctionTrace trace("printDeviceTree");
     switch (type) {
     case TREE_ISCSI:
         printIscsiTree();

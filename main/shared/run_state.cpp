@@ -1,5 +1,4 @@
-#include "main/run_state.hpp"
+#include "main/shared/run_state.hpp"
 
 char* gHostName = nullptr;
-bool gDirectAttachedFlag = false;
 ZebSensorLinuxPowerPathHandler gPowerPath;

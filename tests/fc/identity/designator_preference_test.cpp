@@ -5,9 +5,9 @@
 
 #include <gtest/gtest.h>
 
-#include "fc/unique_lun_id.hpp"
-#include "main/run_state.hpp"
-#include "tests/fc/unique_lun_id_log.hpp"
+#include "fc/identity/unique_lun_id.hpp"
+#include "main/shared/run_state.hpp"
+#include "tests/fc/identity/unique_lun_id_log.hpp"
 
 namespace {
 

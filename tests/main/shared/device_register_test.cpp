@@ -1,4 +1,4 @@
-#include "main/device_register.hpp"
+#include "main/shared/device_register.hpp"
 
 #include <string>
 

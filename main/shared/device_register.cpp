@@ -1,7 +1,7 @@
-#include "main/device_register.hpp"
+#include "main/shared/device_register.hpp"
 
 #include "foundation/clib_memory.hpp"
-#include "foundation/clib_stream.hpp"
+#include "foundation/log.hpp"
 #include "foundation/trace.hpp"
 
 ZebTwoLevelMap<uint32>::Map DevMap;
@@ -43,19 +43,19 @@ uint32 EmulexHash(const char* name) {
 }
 
 void addDeviceNameMap(uint32 type, const ZebString& name) {
-    TRACE_ENTRY("addDeviceNameMap");
+    const FunctionTrace trace("addDeviceNameMap");
     const uint32 hash = EmulexHash(name.c_str());
     ZebTwoLevelMap<uint32>::insert(DevMap, hash, name, type);
-    Clib_fprintf(gLogStream, "Added to DevMap %u --> %s --> %x\n", hash, name.c_str(), type);
-    TRACE_EXIT("addDeviceNameMap");
+    reportPrintf("Added to DevMap %u --> %s --> %x\n", hash, name.c_str(), type);
+    trace.exit();
 }
 
 uint32 getDeviceType(const ZebString& name) {
-    TRACE_ENTRY("getDeviceType");
+    const FunctionTrace trace("getDeviceType");
     const uint32 hash = EmulexHash(name.c_str());
     if (ZebTwoLevelMap<uint32>::contains(DevMap, hash, name)) {
         return ZebTwoLevelMap<uint32>::lookup(DevMap, hash, name);
     }
-    TRACE_EXIT("getDeviceType");
+    trace.exit();
     return 0;
 }

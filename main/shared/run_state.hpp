@@ -7,9 +7,5 @@
 extern char* gHostName;
 constexpr unsigned kHostNameSize = 256;
 
-// Set by HA_GetScsiUniqueLunId when it accepts a device of request flag 2 without an identifier; read and
-// cleared by the report of that device.
-extern bool gDirectAttachedFlag;
-
 // Knows whether PowerPath runs, and its pseudo device of each logical unit.
 extern ZebSensorLinuxPowerPathHandler gPowerPath;

@@ -1,7 +1,7 @@
 // The stand-ins below need the plain declarations of the functions that they replace.
 #undef _FORTIFY_SOURCE
 
-#include "tests/host/host_files.hpp"
+#include "tests/support/host_files.hpp"
 
 #include <dirent.h>
 #include <dlfcn.h>

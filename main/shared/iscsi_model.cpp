@@ -1,0 +1,3 @@
+#include "main/shared/iscsi_model.hpp"
+
+IscsiPorts::List gIscsiPortList;
