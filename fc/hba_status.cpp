@@ -3,7 +3,7 @@
 #include <iterator>
 
 const char* hbaStatusName(HBA_STATUS status) {
-    static const char* const sNames[] = {
+    static const char* const kNames[] = {
         "HBA_STATUS_OK",
         "HBA_STATUS_ERROR",
         "HBA_STATUS_ERROR_NOT_SUPPORTED",
@@ -36,5 +36,5 @@ const char* hbaStatusName(HBA_STATUS status) {
         "HBA_STATUS_ERROR_INCAPABLE",
         "HBA_STATUS_ERROR_TARGET_BUSY",
     };
-    return status < std::size(sNames) ? sNames[status] : "Invalid Hbaapi Status Code";
+    return status < std::size(kNames) ? kNames[status] : "Invalid Hbaapi Status Code";
 }

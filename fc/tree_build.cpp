@@ -217,24 +217,26 @@ const HBA_ADAPTERATTRIBUTES* sBuildAdapterAttributes(HBA_HANDLE handle) {
     const FunctionTrace trace("sBuildAdapterAttributes");
     logPrintf("Going to get Adapter Attributes\n");
     std::unique_ptr<HBA_ADAPTERATTRIBUTES> attributes = HA_GetAdapterAttributes(handle);
-    const HBA_ADAPTERATTRIBUTES* const record = attributes.get();
-    if (attributes != nullptr) {
-        logPrintf("Storing Adapter Attributes\n");
-        store(openAdapter(handle).attributes, std::move(attributes));
+    if (attributes == nullptr) {
+        trace.exit();
+        return nullptr;
     }
+    logPrintf("Storing Adapter Attributes\n");
+    auto& place = openAdapter(handle).attributes;
+    store(place, std::move(attributes));
     trace.exit();
-    return record;
+    return place.get();
 }
 
 const PortAttributes& sBuildPortAttributes(HBA_HANDLE handle, const HBA_ADAPTERATTRIBUTES& adapter) {
     const FunctionTrace trace("sBuildPortAttributes");
     logPrintf("Going to get adapter ports\n");
     std::unique_ptr<PortAttributes> ports = HA_GetAdapterPorts(handle, adapter);
-    const PortAttributes& records = *ports;
     logPrintf("Storing Port Attributes\n");
-    store(openAdapter(handle).ports, std::move(ports));
+    auto& place = openAdapter(handle).ports;
+    store(place, std::move(ports));
     trace.exit();
-    return records;
+    return *place;
 }
 
 const HBA_FCPTARGETMAPPINGV2& sBuildTargetMappings(HBA_HANDLE handle) {

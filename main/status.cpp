@@ -2,7 +2,7 @@
 
 const char* getStatusString(uint32 code) {
     constexpr uint32 kLastNamedCode = 3;
-    static const char* const sNames[] = {"Success", "Generic Error", "Hbaapi Error", "Not Implemented",
+    static const char* const kNames[] = {"Success", "Generic Error", "Hbaapi Error", "Not Implemented",
                                          "No Tree"};
-    return code > kLastNamedCode ? "Invalid Status Code\n" : sNames[code];
+    return code > kLastNamedCode ? "Invalid Status Code\n" : kNames[code];
 }
