@@ -69,6 +69,7 @@ bool PortAttributes::allocateRecords() {
 void HA_LoadHbaapi() {
     const FunctionTrace trace("HA_LoadHbaapi");
     logPrintf("Going to open HBAAPI library\n");
+    flushLog();
     const HBA_STATUS status = HBA_LoadLibrary();
     if (status != HBA_STATUS_OK) {
         logPrintf("Failed to load HBAAPI library : %s\n", hbaStatusName(status));
@@ -80,6 +81,7 @@ void HA_LoadHbaapi() {
 void HA_FreeHbaapi() {
     const FunctionTrace trace("HA_FreeHbaapi");
     logPrintf("Going to free the HBAAPI library\n");
+    flushLog();
     static_cast<void>(HBA_FreeLibrary());
     logPrintf("Freed HBAAPI library\n");
     trace.exit();
@@ -87,6 +89,7 @@ void HA_FreeHbaapi() {
 
 uint32 HA_GetNumberOfAdapters() {
     const FunctionTrace trace("HA_GetNumberOfAdapters");
+    flushLog();
     const uint32 count = HBA_GetNumberOfAdapters();
     trace.exit();
     return count;
@@ -97,6 +100,7 @@ void HA_GetAdapterNames(uint32 count, std::vector<ZebString>& names) {
     for (uint32 index = 0; index < count; ++index) {
         char name[kAdapterNameSize + 1] = {}; // ends even a name that fills its field
         logPrintf("Going to get adapter name, # = <%d>\n", static_cast<int32>(index));
+        flushLog();
         const HBA_STATUS status = HBA_GetAdapterName(index, name);
         if (status != HBA_STATUS_OK) {
             logPrintf("Failed to get adapter #%d name - %s\n", static_cast<int32>(index),
@@ -113,6 +117,7 @@ void HA_GetAdapterNames(uint32 count, std::vector<ZebString>& names) {
 HBA_HANDLE HA_OpenAdapter(char* name) {
     const FunctionTrace trace("HA_OpenAdapter");
     logPrintf("Going to open adapter, adapter name = <%s>\n", name);
+    flushLog();
     const HBA_HANDLE handle = HBA_OpenAdapter(name);
     if (handle == 0) {
         logPrintf("Failed to open adapter, adapter name = <%s>\n", name);
@@ -125,6 +130,7 @@ HBA_HANDLE HA_OpenAdapter(char* name) {
 void HA_CloseAdapter(HBA_HANDLE handle) {
     const FunctionTrace trace("HA_CloseAdapter");
     logPrintf("Going to close adapter...\n");
+    flushLog();
     HBA_CloseAdapter(handle);
     logPrintf("Closed adapter\n");
     trace.exit();
@@ -138,6 +144,7 @@ std::unique_ptr<HBA_ADAPTERATTRIBUTES> HA_GetAdapterAttributes(HBA_HANDLE handle
                                   "No memory for adapter attributes\n");
     }
     logPrintf("Going to get adapter attributes\n");
+    flushLog();
     const HBA_STATUS status = HBA_GetAdapterAttributes(handle, attributes.get());
     if (status == HBA_STATUS_ERROR_NOT_SUPPORTED) {
         logPrintf("Encountered non-supported Adapter - %s\n", hbaStatusName(status));
@@ -169,6 +176,7 @@ std::unique_ptr<PortAttributes> HA_GetAdapterPorts(HBA_HANDLE handle, const HBA_
     }
     for (uint32 index = 0; index < ports->count(); ++index) {
         logPrintf("Going to get port attributes\n");
+        flushLog();
         const HBA_STATUS status = HBA_GetAdapterPortAttributes(handle, index, &(*ports)[index]);
         if (status != HBA_STATUS_OK) {
             logPrintf("Failed to get port attributes - %s\n", hbaStatusName(status));
@@ -190,6 +198,7 @@ MappingBlock<HBA_FCPTARGETMAPPING> HA_GetTargetMappings(HBA_HANDLE handle) {
     }
     mapping->NumberOfEntries = 1;
     logPrintf("Going to invoke HBA_GetFcpTargetMapping to get target mappings\n");
+    flushLog();
     HBA_STATUS status = HBA_GetFcpTargetMapping(handle, mapping.get());
     const uint32 count = mapping->NumberOfEntries;
     logPrintf("The status of get fcp target mapping: %u\n", status);
@@ -211,6 +220,7 @@ MappingBlock<HBA_FCPTARGETMAPPING> HA_GetTargetMappings(HBA_HANDLE handle) {
         mapping->NumberOfEntries = count;
         logPrintf("Invoking HBA_GetFcpTargetMapping to get <%d> target mappings\n",
                   static_cast<int32>(count));
+        flushLog();
         status = HBA_GetFcpTargetMapping(handle, mapping.get());
         logPrintf("The status of get fcp target mapping: %u\n", status);
         if (status != HBA_STATUS_OK) {

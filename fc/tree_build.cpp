@@ -16,6 +16,7 @@
 #include "foundation/log.hpp"
 #include "foundation/trace.hpp"
 #include "main/shared/device_register.hpp"
+#include "main/shared/progress.hpp"
 #include "main/shared/run_state.hpp"
 
 namespace {
@@ -154,10 +155,13 @@ BuiltMapping buildTargetMappings(HBA_HANDLE handle, const FunctionTrace& trace) 
     logPrintf("Going to get target mappings\n");
     const MappingBlock<HBA_FCPTARGETMAPPING> source = HA_GetTargetMappings(handle);
     BuiltMapping result = allocateBuiltMapping(source->NumberOfEntries, trace);
-    for (uint32 i = 0; i < source->NumberOfEntries; ++i) {
+    const uint32 count = source->NumberOfEntries;
+    for (uint32 i = 0; i < count; ++i) {
+        showProgress("FC vendors", source->entry[i].ScsiId.OSDeviceName, i + 1, count);
         logVendorData(source->entry[i]);
     }
-    for (uint32 i = 0; i < source->NumberOfEntries; ++i) {
+    for (uint32 i = 0; i < count; ++i) {
+        showProgress("FC", source->entry[i].ScsiId.OSDeviceName, i + 1, count);
         // Slots are filled at the source's index and counted apart, so an entry that is left out before the
         // last leaves an empty slot among the counted ones, and the last one out of them.
         if (identify(source->entry[i], result->entry[i])) {
@@ -282,6 +286,7 @@ void sBuildAndOutput() {
         logPrintf("Going to open Adapter #%u - '%s'\n", index, names[index].c_str());
         std::string name = expandAdapterName(names[index].c_str());
         try {
+            showProgress("FC adapter", name.c_str(), index + 1, count);
             const HBA_HANDLE handle = HA_OpenAdapter(name.data());
             logPrintf("Storing Adapter Handle\n");
             gOpenAdapters.emplace_back(handle);
@@ -298,6 +303,7 @@ void sBuildAndOutput() {
 void sFirstBuildAndOutput() {
     const FunctionTrace trace("sFirstBuildAndOutput");
     const timeval start = wallClock();
+    showProgress("FC", "loading the HBA library");
     HA_LoadHbaapi();
     const timeval end = wallClock();
     logPrintf("Time taken to load HBAAPI: %.2f milliseconds\n", elapsedMilliseconds(start, end));

@@ -6,6 +6,6 @@
 
 void assertionFailed(const char* conditionText) {
     // The process ends here whether or not the log still takes the line.
-    logPrintfNoThrow("Assertion [ %s ] failed\n", conditionText);
+    logLineNoThrow("Assertion [ %s ] failed\n", {conditionText});
     std::exit(1);
 }

@@ -1,11 +1,67 @@
 #include "foundation/command_output.hpp"
 
-// NOLINTNEXTLINE(cert-env33-c): the commands are fixed
-CommandOutput::CommandOutput(const char* command) : mStream(popen(command, "r")) {}
+#include <fcntl.h>
+#include <spawn.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+
+#include "foundation/log.hpp"
+
+namespace {
+
+// Starts a shell on the command, its standard output going to `output`. Returns its process, or -1.
+pid_t start(const char* command, int output) {
+    const char* const arguments[] = {"sh", "-c", command, nullptr};
+    const char* const environment[] = {"PATH=/usr/sbin:/usr/bin:/sbin:/bin", "LC_ALL=C", nullptr};
+    posix_spawn_file_actions_t actions;
+    if (posix_spawn_file_actions_init(&actions) != 0) {
+        return -1;
+    }
+    pid_t process = -1;
+    // The arrays of a program's arguments are only read.
+    if (posix_spawn_file_actions_addopen(&actions, STDIN_FILENO, "/dev/null", O_RDONLY, 0) != 0 ||
+        posix_spawn_file_actions_adddup2(&actions, output, STDOUT_FILENO) != 0 ||
+        posix_spawn(&process, "/bin/sh", &actions, nullptr,
+                    const_cast<char* const*>(arguments),           // NOLINT(*-const-cast)
+                    const_cast<char* const*>(environment)) != 0) { // NOLINT(*-const-cast)
+        process = -1;
+    }
+    posix_spawn_file_actions_destroy(&actions);
+    return process;
+}
+
+} // namespace
+
+CommandOutput::CommandOutput(const char* command) {
+    flushLog();
+    int ends[2];
+    if (pipe2(ends, O_CLOEXEC) != 0) {
+        return;
+    }
+    mStream = fdopen(ends[0], "r");
+    if (mStream == nullptr) {
+        static_cast<void>(::close(ends[0]));
+    } else if ((mProcess = start(command, ends[1])) < 0) {
+        static_cast<void>(std::fclose(mStream));
+        mStream = nullptr;
+    }
+    static_cast<void>(::close(ends[1]));
+}
 
 void CommandOutput::close() {
-    if (mStream != nullptr) {
-        static_cast<void>(pclose(mStream));
-        mStream = nullptr;
+    flushLog();
+    finish();
+}
+
+void CommandOutput::finish() noexcept {
+    if (mStream == nullptr) {
+        return;
+    }
+    static_cast<void>(std::fclose(mStream));
+    mStream = nullptr;
+    while (waitpid(mProcess, nullptr, 0) < 0 && errno == EINTR) {
+        // interrupted: the command is still to be waited for
     }
 }

@@ -2,12 +2,19 @@
 
 #include "foundation/log.hpp"
 
+namespace {
+
+constexpr const char* kEntry = "Entered Function %s Line %u\n";
+constexpr const char* kExit = "Left Function %s Line %u\n";
+
+} // namespace
+
 void TRACE_ENTRY(const char* name, unsigned line) {
-    logPrintf("Entered Function %s Line %u\n", name, line);
+    logLine(kEntry, {name, line});
 }
 
 void TRACE_EXIT(const char* name, unsigned line) {
-    logPrintf("Left Function %s Line %u\n", name, line);
+    logLine(kExit, {name, line});
 }
 
 FunctionTrace::FunctionTrace(const char* name, unsigned line) : mName(name), mThrows(true) {
@@ -16,14 +23,14 @@ FunctionTrace::FunctionTrace(const char* name, unsigned line) : mName(name), mTh
 
 FunctionTrace::FunctionTrace(std::nothrow_t /*tag*/, const char* name, unsigned line) noexcept
     : mName(name), mThrows(false) {
-    logPrintfNoThrow("Entered Function %s Line %u\n", name, line);
+    logLineNoThrow(kEntry, {name, line});
 }
 
 void FunctionTrace::log(const char* text) const {
     if (mThrows) {
-        logPrintf("%s", text);
+        logLine("%s", {text});
     } else {
-        logPrintfNoThrow("%s", text);
+        logLineNoThrow("%s", {text});
     }
 }
 
@@ -31,6 +38,6 @@ void FunctionTrace::exit(unsigned line) const {
     if (mThrows) {
         TRACE_EXIT(mName, line);
     } else {
-        logPrintfNoThrow("Left Function %s Line %u\n", mName, line);
+        logLineNoThrow(kExit, {mName, line});
     }
 }

@@ -16,7 +16,7 @@
 #include "foundation/log.hpp"
 #include "foundation/trace.hpp"
 #include "main/shared/device_register.hpp"
-#include "main/shared/iscsi_model.hpp"
+#include "main/shared/progress.hpp"
 #include "main/shared/run_state.hpp"
 
 namespace {
@@ -102,6 +102,7 @@ char* cutToken(char* position) {
 
 void IscsiListing::addIscsiPath(const ZebString& devName) {
     const FunctionTrace trace("addIscsiPath");
+    showProgress("iSCSI", devName.c_str());
     const ZebString port = initiatorPort();
     ZebString lunId("");
     addDeviceNameMap(TREE_ISCSI, devName);
@@ -187,6 +188,7 @@ void IscsiListing::processCmdOutput(char* line) {
 
 uint32 IscsiListing::readInitiatorIQN() {
     const FunctionTrace trace("readInitiatorIQN");
+    flushLog();
     const std::unique_ptr<std::FILE, decltype(&std::fclose)> file(std::fopen(kInitiatorNameFile, "r"),
                                                                   &std::fclose);
     if (!file) {

@@ -8,6 +8,7 @@
 #include "main/shared/banner.hpp"
 #include "main/shared/device_register.hpp"
 #include "main/shared/device_report.hpp"
+#include "main/shared/progress.hpp"
 
 namespace {
 
@@ -18,6 +19,7 @@ constexpr const char* kSessionCommand = "/sbin/iscsiadm -m session --print=3 2>/
 void BuildIscsiTree_Linux() {
     const FunctionTrace trace("BuildIscsiTree_Linux");
     reportBanner("============= ISCSI DEVICE DETAILS =============");
+    showProgress("iSCSI", "iscsiadm");
     CommandOutput output(kSessionCommand);
     if (!output.isOpen()) {
         reportPrintf("Failed to open pipe for /sbin/iscsiadm!\n\n");
@@ -37,7 +39,12 @@ void BuildIscsiTree_Linux() {
         return;
     }
     LineBuffer lines;
-    while (char* const line = lines.next(output.stream())) {
+    for (;;) {
+        flushLog();
+        char* const line = lines.next(output.stream());
+        if (line == nullptr) {
+            break;
+        }
         listing.processCmdOutput(line);
     }
     output.close();

@@ -2,6 +2,7 @@
 
 #include <cstring>
 #include <exception>
+#include <memory>
 
 #include "foundation/clib_stream.hpp"
 #include "foundation/log.hpp"
@@ -36,14 +37,16 @@ void reportLine(char* line) {
 uint32 gatherLogicalInfo() {
     try {
         const FunctionTrace trace("gatherLogicalInfo");
-        std::FILE* const stream = Clib_fopen("/proc/partitions", ClibFM_Read);
+        flushLog();
+        std::unique_ptr<std::FILE, decltype(&std::fclose)> stream(Clib_fopen("/proc/partitions", ClibFM_Read),
+                                                                  &std::fclose);
         char line[kLineSize] = {};
-        while (Clib_fgets(line, sizeof line, stream) != nullptr) {
+        while (Clib_fgets(line, sizeof line, stream.get()) != nullptr) {
             if (line[0] == ' ') { // the heading and the empty line after it do not begin so
                 reportLine(line);
             }
         }
-        Clib_fclose(stream);
+        Clib_fclose(stream.release());
         trace.exit();
         return kGathered;
     } catch (const std::exception&) {

@@ -1,12 +1,13 @@
 // The entry: one linear run, from the log directory to the closing banner.
-#include <sys/stat.h>
 #include <unistd.h>
 
+#include <cstdio>
 #include <cstdlib>
 #include <exception>
 #include <new>
+#include <string>
 
-#include "foundation/clib_path.hpp"
+#include "foundation/clib_error.hpp"
 #include "foundation/clib_stream.hpp"
 #include "foundation/exceptions.hpp"
 #include "foundation/log.hpp"
@@ -14,43 +15,17 @@
 #include "host/iscsi_tree.hpp"
 #include "host/logical_tree.hpp"
 #include "main/fc_tree.hpp"
+#include "main/log_file.hpp"
 #include "main/shared/banner.hpp"
+#include "main/shared/progress.hpp"
 #include "main/shared/run_state.hpp"
 
 namespace {
 
-constexpr const char* kLogDirectory = "./MorvaneLogs";
-constexpr const char* kLogFile = "./MorvaneLogs/Morvane.log";
-constexpr mode_t kLogDirectoryMode = 0777; // less the umask
-
-void makeLogDirectory() {
-    struct stat status {};
-    try {
-        Clib_stat(kLogDirectory, &status);
-    } catch (const ClibStatFailedEx&) {
-        try {
-            Clib_mkdir(kLogDirectory, kLogDirectoryMode);
-        } catch (const ClibMkdirFailedEx&) {
-            Clib_printf("Failed in creating the directory for keeping the log files\n");
-            std::exit(1);
-        } catch (const ExistsEx&) {
-            return; // another process made it meanwhile
-        }
-    }
-}
-
-void openLog() {
-    try {
-        gLogStream = Clib_fopen(kLogFile, ClibFM_WriteUpdate);
-    } catch (...) {
-        Clib_printf("Failed in opening the logfile\n");
-        std::exit(1);
-    }
-}
-
 void checkMultipath() {
     reportBanner("\t\tCheck for Multipath software");
     logPrintf("Checking the powerpath\n");
+    showProgress("multipath", "PowerPath");
     gPowerPath.sense();
     if (gPowerPath.isRunning()) {
         gPowerPath.printData();
@@ -69,8 +44,7 @@ void runGuarded(const char* treeName, void (*buildTree)()) {
 }
 
 void run() {
-    makeLogDirectory();
-    openLog();
+    gLogStream = openLogFile();
     checkMultipath();
 
     gHostName = new (std::nothrow) char[kHostNameSize]();
@@ -89,20 +63,36 @@ void run() {
         delete[] gHostName;
         gHostName = nullptr;
     }
+    clearProgress();
+    completeLogFile(gLogStream);
     Clib_printf("Test completed.\n");
+    if (std::fflush(stdout) != 0) {
+        throw WriteFailedEx((std::string("standard output: ") + ErrnoText().text).c_str());
+    }
+}
+
+// Why the run could not go on, as one line. A log that could not take something is behind whatever came of
+// it.
+std::string failureLine(const char* message) {
+    std::string line = logError() != 0 ? logFailure(logError()) : message;
+    line.erase(line.find_last_not_of('\n') + 1);
+    return "morvane: " + line + "\n";
 }
 
 } // namespace
 
 int main() {
+    static_cast<void>(std::atexit(clearProgress)); // for a failed assertion, too
     try {
         run();
         return EXIT_SUCCESS;
     } catch (const std::exception& exception) {
         // Nothing stands between this failure and the end of the program; exit flushes the log so far.
-        static_cast<void>(std::fputs(exception.what(), stderr));
+        clearProgress();
+        static_cast<void>(std::fputs(failureLine(exception.what()).c_str(), stderr));
     } catch (...) {
-        static_cast<void>(std::fputs("unknown exception\n", stderr));
+        clearProgress();
+        static_cast<void>(std::fputs("morvane: unknown exception\n", stderr));
     }
     return EXIT_FAILURE;
 }

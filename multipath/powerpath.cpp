@@ -52,6 +52,7 @@ void ZebSensorLinuxPowerPathHandler::sense() {
     for (unsigned attempts = 0; lines.size() < kLeastLines && attempts < kMostAttempts; ++attempts) {
         sExecuteCommand(kDeviceListing, lines);
         if (lines.size() < kLeastLines) {
+            flushLog();
             Clib_msleep(kPauseMs);
         }
     }
@@ -110,6 +111,7 @@ void ZebSensorLinuxPowerPathHandler::sExecuteCommand(const char* command, LineLi
             Clib_memset(position, 0, static_cast<std::size_t>(end - position));
             // A line that fills the buffer leaves room for no more bytes, and so ends the reading.
             const auto room = static_cast<std::size_t>(end - position) - 1;
+            flushLog();
             const std::size_t count = Clib_fread(position, 1, room, output.stream());
             if (count == 0) {
                 logPrintf("Fread returned ERROR\n");

@@ -29,9 +29,9 @@ ZebScsiInquiry::Context makeContext() {
 
 template <typename Byte>
 void dumpBytes(uint32 count, Byte byteAt) {
-    logPrintf("Going to dump %u bytes\n", count);
+    logLine("Going to dump %u bytes\n", {count});
     for (uint32 i = 0; i < count; ++i) {
-        logPrintf("Byte %u: 0x%x", i, byteAt(i));
+        logLine("Byte %u: 0x%x", {i, byteAt(i)});
     }
     logPrintf("\n");
 }

@@ -94,12 +94,14 @@ template <typename Exception>
 
 void ZebScsiIoHandlerLinux::open(const ZebString& path, int32& fdOut) {
     const FunctionTrace trace("open");
-    fdOut = Clib_open(path.c_str(), O_RDONLY | O_NONBLOCK, 0);
+    flushLog();
+    fdOut = Clib_open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC, 0);
     trace.exit();
 }
 
 void ZebScsiIoHandlerLinux::close(int32 fd) {
     const FunctionTrace trace("close");
+    flushLog();
     Clib_close(fd);
     trace.exit();
 }
@@ -120,6 +122,7 @@ void ZebScsiIoHandlerLinux::doScsiIo(int32 fd, uint32 timeout_ms,
         throw NotSupportedEx(missing->thrown);
     }
     header.timeout = timeout_ms;
+    flushLog(); // before the clock starts: a slow disk under the log is not the device's fault
 
     const timeb start = wallClock();
     const int result = ioctl(fd, SG_IO, ioObject.get());

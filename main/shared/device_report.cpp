@@ -9,6 +9,7 @@
 #include "foundation/trace.hpp"
 #include "main/shared/device_register.hpp"
 #include "main/shared/iscsi_model.hpp"
+#include "main/shared/progress.hpp"
 #include "main/shared/reconfirm_das.hpp"
 #include "main/shared/run_state.hpp"
 
@@ -58,6 +59,7 @@ void printDasDevice(char* name) {
         *bang = '/';
     }
     const DevicePath devName(name);
+    showProgress("DAS", devName.text);
     if (getDeviceType(devName.text) != 0 || reconfirmDAS(devName.text) == 0) {
         return;
     }

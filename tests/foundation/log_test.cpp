@@ -1,7 +1,9 @@
 #include "foundation/log.hpp"
 
+#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
+#include <fstream>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -9,6 +11,7 @@
 #include "foundation/exceptions.hpp"
 #include "tests/support/log_capture.hpp"
 #include "tests/support/refusing_log.hpp"
+#include "tests/support/temporary_directory.hpp"
 #include "tests/support/thrown.hpp"
 
 namespace {
@@ -63,6 +66,57 @@ TEST(ReportPrintf, WritesAsLogPrintfAndFailsWithAMessageOfItsOwn) {
     }
     const RefusingLog log;
     EXPECT_EQ(messageOf<WriteFailedEx>([] { reportPrintf("line\n"); }), "File write failed");
+}
+
+TEST(LogLine, PutsTextsAndNumbersIntoTheirPlaces) {
+    const LogCapture log;
+    logLine("Entered Function %s Line %u\n", {"sense", 168U});
+    logLine("Byte %u: 0x%x", {4294967295U, 255U});
+    logLine("Byte %u: 0x%x", {0U, 0U});
+    logLine("\n");
+    EXPECT_EQ(log.exactText(), "Entered Function sense Line 168\nByte 4294967295: 0xffByte 0: 0x0\n");
+}
+
+TEST(LogLine, WritesAPercentSignOfAText) {
+    const LogCapture log;
+    logLine("%s", {"100% of %u\n"});
+    EXPECT_EQ(log.exactText(), "100% of %u\n");
+}
+
+TEST(LogLine, TakesTextsOfAnyLength) {
+    for (const std::size_t length : {0U, 1U, 254U, 255U, 256U, 257U, 511U, 512U, 100000U}) {
+        const LogCapture log;
+        const std::string text(length, 'x');
+        logLine("a%sb%sc", {text.c_str(), text.c_str()});
+        EXPECT_EQ(log.exactText(), "a" + text + "b" + text + "c");
+    }
+}
+
+TEST(Log, TakesNothingBehindTheFirstTextThatWasRefused) {
+    const RefusingLog log(1);
+    logPrintf("one\n");
+    EXPECT_EQ(messageOf<WriteFailedEx>([] { logPrintf("two\n"); }), kRefused);
+    EXPECT_EQ(logError(), ENOSPC);
+    EXPECT_EQ(messageOf<WriteFailedEx>([] { logPrintf("three\n"); }), kRefused);
+    EXPECT_EQ(messageOf<WriteFailedEx>([] { reportPrintf("four\n"); }), "File write failed");
+    EXPECT_EQ(messageOf<WriteFailedEx>([] { logLine("five\n"); }), kRefused);
+    logLineNoThrow("six\n");
+    EXPECT_EQ(messageOf<WriteFailedEx>([] { flushLog(); }), kRefused);
+    EXPECT_EQ(log.refusals(), 1);
+}
+
+TEST(Log, IsWithTheKernelOnceItIsFlushed) {
+    const TemporaryDirectory folder;
+    const std::string file = folder.path("log");
+    gLogStream = std::fopen(file.c_str(), "w");
+    logPrintf("line\n");
+    flushLog();
+    std::ifstream reader(file);
+    std::string text;
+    std::getline(reader, text);
+    EXPECT_EQ(text, "line");
+    static_cast<void>(std::fclose(gLogStream));
+    gLogStream = nullptr;
 }
 
 } // namespace

@@ -11,6 +11,7 @@
 #include <cstring>
 
 #include "foundation/assertion.hpp"
+#include "foundation/command_output.hpp"
 #include "foundation/exceptions.hpp"
 #include "foundation/log.hpp"
 
@@ -69,6 +70,24 @@ void respond(sg_io_hdr& header, std::string_view data) {
     header.resid = static_cast<int>(header.dxfer_len - count);
 }
 
+// In the place of foundation's own: the command prints what the host says.
+CommandOutput::CommandOutput(const char* command) {
+    if (const std::string* const output = gHost.command ? gHost.command(command) : nullptr) {
+        mStream = memoryFile(*output);
+    }
+}
+
+void CommandOutput::close() {
+    finish();
+}
+
+void CommandOutput::finish() noexcept {
+    if (mStream != nullptr) {
+        static_cast<void>(std::fclose(mStream));
+        mStream = nullptr;
+    }
+}
+
 // In the place of the product's and the C library's functions (see CMakeLists.txt): the linker's names.
 // NOLINTBEGIN(bugprone-reserved-identifier, readability-identifier-naming, cert-dcl37-c, cert-dcl51-cpp)
 extern "C" {
@@ -83,19 +102,6 @@ std::FILE* __wrap_fopen(const char* path, const char* mode) {
         return memoryFile(file->second);
     }
     return __real_fopen(path, mode);
-}
-
-std::FILE* __wrap_popen(const char* command, const char* /*mode*/) {
-    const std::string* const output = gHost.command ? gHost.command(command) : nullptr;
-    if (output == nullptr) {
-        errno = EAGAIN;
-        return nullptr;
-    }
-    return memoryFile(*output);
-}
-
-int __wrap_pclose(std::FILE* stream) {
-    return std::fclose(stream);
 }
 
 int __wrap_usleep(useconds_t /*microseconds*/) {

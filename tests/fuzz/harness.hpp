@@ -23,7 +23,7 @@ void runInput(std::initializer_list<std::string_view> fatalConditions, const std
 struct ScriptedHost {
     // Content of files by path; one that is not here cannot be opened by the product.
     std::map<std::string, std::string> files;
-    // Output of the command that popen() is given; null for a popen that fails.
+    // Output of a shell command; null for one that cannot be started.
     std::function<const std::string*(const std::string& command)> command;
     // Answers an SG_IO: returns 0, or the error number that the ioctl fails with.
     std::function<int(sg_io_hdr& header)> device;

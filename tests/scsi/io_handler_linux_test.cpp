@@ -126,7 +126,7 @@ TEST(IoHandlerOpen, IsReadOnlyAndDoesNotBlock) {
     EXPECT_EQ(fd, FakeKernel::kFirstFd);
     ASSERT_EQ(kernel.opens.size(), 1U);
     EXPECT_EQ(kernel.opens[0].path, "/dev/sdx");
-    EXPECT_EQ(kernel.opens[0].flags, O_RDONLY | O_NONBLOCK);
+    EXPECT_EQ(kernel.opens[0].flags, O_RDONLY | O_NONBLOCK | O_CLOEXEC);
     EXPECT_EQ(kernel.opens[0].mode, 0U);
     EXPECT_EQ(log.text(), traced("open"));
 }

@@ -1,12 +1,12 @@
 #include "tests/support/fake_commands.hpp"
 
-#include <dlfcn.h>
-
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <memory>
 #include <set>
+
+#include "foundation/command_output.hpp"
 
 namespace {
 
@@ -64,33 +64,31 @@ std::size_t FakeCommands::openStreams() {
     return gOpenStreams.size();
 }
 
-extern "C" {
+// In the place of foundation's own.
 
-std::FILE* popen(const char* command, const char* modes) {
+CommandOutput::CommandOutput(const char* command) {
     if (gCommands == nullptr) {
-        static auto* const real =
-            reinterpret_cast<std::FILE* (*)(const char*, const char*)>(dlsym(RTLD_NEXT, "popen"));
-        return real(command, modes);
+        return; // no command can be started
     }
     FakeRun run = gCommands->take(command);
     if (!run.canStart) {
-        errno = EMFILE;
-        return nullptr;
+        return;
     }
     auto output = std::make_unique<Output>();
     output->run = std::move(run);
-    std::FILE* const stream =
-        fopencookie(output.release(), modes,
-                    {.read = readOutput, .write = nullptr, .seek = nullptr, .close = closeOutput});
-    gOpenStreams.insert(stream);
-    return stream;
+    mStream = fopencookie(output.release(), "r",
+                          {.read = readOutput, .write = nullptr, .seek = nullptr, .close = closeOutput});
+    gOpenStreams.insert(mStream);
 }
 
-int pclose(std::FILE* stream) {
-    if (gOpenStreams.erase(stream) == 0) {
-        static auto* const real = reinterpret_cast<int (*)(std::FILE*)>(dlsym(RTLD_NEXT, "pclose"));
-        return real(stream);
-    }
-    return std::fclose(stream);
+void CommandOutput::close() {
+    finish();
 }
+
+void CommandOutput::finish() noexcept {
+    if (mStream != nullptr) {
+        gOpenStreams.erase(mStream);
+        static_cast<void>(std::fclose(mStream));
+        mStream = nullptr;
+    }
 }

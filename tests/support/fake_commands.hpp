@@ -1,4 +1,4 @@
-// The commands that the program runs through popen, answered by the test.
+// The commands that the program runs, answered by the test.
 #pragma once
 
 #include <deque>
@@ -9,13 +9,13 @@
 // One run of a command.
 struct FakeRun {
     std::string output;
-    bool canStart = true;   // false: popen fails
+    bool canStart = true;   // false: the command cannot be started
     bool readFails = false; // behind the output stands a read error in place of the end
 };
 
 // While it lives no command is run: each run of a command gives its next answer, and prints nothing once the
-// answers are used up. Streams that are left open are closed at its end. Without one, popen and pclose are
-// the C library's.
+// answers are used up. Streams that are left open are closed at its end. Without one,
+// no command can be started.
 class FakeCommands {
 public:
     FakeCommands();
