@@ -33,6 +33,7 @@ void printLun(const HBA_FCPSCSIENTRYV2& entry, std::FILE* stream) {
 void HA_PrintAdapterTree(const HBA_ADAPTERATTRIBUTES& adapter, const PortAttributes& ports,
                          const HBA_FCPTARGETMAPPINGV2& mapping, std::FILE* stream) {
     const FunctionTrace trace("HA_PrintAdapterTree");
+    passLog(); // what is written to the stream itself stands behind it
     Clib_fprintf(stream, "\n");
     Clib_fprintf(stream, "|_ Adapter wwnn ");
     Clib_fprintf(stream, "%s", WwnText(adapter.NodeWWN).text);

@@ -3,10 +3,10 @@
 #include <stdio_ext.h>
 
 #include <cerrno>
-#include <charconv>
 #include <cstdarg>
 #include <cstddef>
 #include <cstring>
+#include <iterator>
 
 #include "foundation/exceptions.hpp"
 
@@ -31,7 +31,7 @@ void refused(std::FILE* stream) noexcept {
 
 // Whether the stream has taken everything so far.
 bool isWhole(std::FILE* stream) noexcept {
-    if (std::ferror(stream) == 0) {
+    if (ferror_unlocked(stream) == 0) {
         return true;
     }
     refused(stream);
@@ -39,85 +39,37 @@ bool isWhole(std::FILE* stream) noexcept {
 }
 
 bool put(std::FILE* stream, const char* text, std::size_t length) noexcept {
-    if (fwrite_unlocked(text, 1, length, stream) == length) {
-        return true;
+    if (!isWhole(stream)) {
+        return false;
     }
-    refused(stream);
-    return false;
+    if (fwrite_unlocked(text, 1, length, stream) != length) {
+        refused(stream);
+        return false;
+    }
+    return true;
 }
 
-// A line on its way to a stream, gathered so that the stream is called once for most lines.
-class Line {
-public:
-    explicit Line(std::FILE* stream) : mStream(stream), mIsTaken(isWhole(stream)) {}
+[[noreturn]] void fail() {
+    throw WriteFailedEx("File write failed\n");
+}
 
-    void add(const char* text, std::size_t length) noexcept {
-        if (length > sizeof mText - mLength) {
-            pass();
-        }
-        if (length > sizeof mText) {
-            mIsTaken = mIsTaken && put(mStream, text, length);
-            return;
-        }
-        std::memcpy(mText + mLength, text, length);
-        mLength += length;
+} // namespace
+
+// The texts that no stream has yet.
+struct GatheredText {
+    static bool pass(std::FILE* stream) noexcept {
+        const bool isTaken = put(stream, LogText::sGathered, LogText::sLength);
+        LogText::sLength = 0;
+        return isTaken;
     }
-
-    void add(uint32 number, int base) noexcept {
-        char digits[10]; // of the largest decimal number
-        const auto end = std::to_chars(digits, digits + sizeof digits, number, base).ptr;
-        add(digits, static_cast<std::size_t>(end - digits));
-    }
-
-    // Whether the stream took the line.
-    bool end() noexcept {
-        pass();
-        return mIsTaken;
-    }
-
-private:
-    void pass() noexcept {
-        mIsTaken = mIsTaken && put(mStream, mText, mLength);
-        mLength = 0;
-    }
-
-    std::FILE* mStream;
-    bool mIsTaken;
-    std::size_t mLength = 0;
-    char mText[256];
 };
 
-bool putLine(const char* format, std::initializer_list<LogField> fields) noexcept {
-    Line line(logStream());
-    const LogField* field = fields.begin();
-    for (const char* rest = format; *rest != '\0';) {
-        const std::size_t literal = std::strcspn(rest, "%");
-        line.add(rest, literal);
-        rest += literal;
-        if (field == fields.end()) {
-            break;
-        }
-        switch (rest[1]) {
-        case 's':
-            line.add(field->text(), std::strlen(field->text()));
-            break;
-        case 'u':
-            line.add(field->number(), 10);
-            break;
-        default: // 'x'
-            line.add(field->number(), 16);
-            break;
-        }
-        ++field;
-        rest += 2;
-    }
-    return line.end();
-}
+namespace {
 
 // The number of characters, or a negative number when the stream refuses them.
 int putFormatted(const char* format, std::va_list arguments) noexcept {
     std::FILE* const stream = logStream();
-    if (!isWhole(stream)) {
+    if (!GatheredText::pass(stream)) {
         return -1;
     }
     const int written = std::vfprintf(stream, format, arguments);
@@ -127,13 +79,16 @@ int putFormatted(const char* format, std::va_list arguments) noexcept {
     return written;
 }
 
-[[noreturn]] void fail() {
-    throw WriteFailedEx("File write failed\n");
-}
-
 } // namespace
 
+char LogText::sGathered[];
+std::size_t LogText::sLength = 0;
+
 int logPrintf(const char* format, ...) {
+    if (std::strchr(format, '%') == nullptr) { // most lines: nothing to be formatted
+        LogText().string(format).write();
+        return static_cast<int>(std::strlen(format));
+    }
     std::va_list arguments;
     va_start(arguments, format);
     const int written = putFormatted(format, arguments);
@@ -155,21 +110,52 @@ int reportPrintf(const char* format, ...) {
     return written;
 }
 
-void logLine(const char* format, std::initializer_list<LogField> fields) {
-    if (!putLine(format, fields)) {
+LogText& LogText::decimal(uint32 number) noexcept {
+    char digits[10]; // of the largest
+    char* first = std::end(digits);
+    do {
+        *--first = static_cast<char>('0' + number % 10);
+        number /= 10;
+    } while (number != 0);
+    return bytes(first, static_cast<std::size_t>(std::end(digits) - first));
+}
+
+LogText& LogText::hex(uint8 byte) noexcept {
+    constexpr char kDigits[] = "0123456789abcdef";
+    const char digits[] = {kDigits[byte >> 4], kDigits[byte & 0x0F]};
+    return byte > 0x0F ? bytes(digits, 2) : bytes(digits + 1, 1);
+}
+
+void LogText::write() {
+    std::FILE* const stream = logStream();
+    if (__fbufsize(stream) <= 1 ? !GatheredText::pass(stream) : !isWhole(stream)) {
         fail();
     }
 }
 
-void logLineNoThrow(const char* format, std::initializer_list<LogField> fields) noexcept {
-    static_cast<void>(putLine(format, fields));
+void LogText::writeNoThrow() noexcept {
+    std::FILE* const stream = logStream();
+    if (__fbufsize(stream) <= 1) {
+        static_cast<void>(GatheredText::pass(stream));
+    }
+}
+
+// For a text that finds no room among the gathered ones.
+LogText& LogText::pass(const char* text, std::size_t length) noexcept {
+    std::FILE* const stream = logStream();
+    static_cast<void>(GatheredText::pass(stream) && put(stream, text, length));
+    return *this;
+}
+
+void passLog() {
+    if (!GatheredText::pass(logStream())) {
+        fail();
+    }
 }
 
 void flushLog() {
+    passLog();
     std::FILE* const stream = logStream();
-    if (!isWhole(stream)) {
-        fail();
-    }
     if (std::fflush(stream) != 0) {
         refused(stream);
         fail();

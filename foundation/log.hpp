@@ -4,8 +4,9 @@
 // log that could not take something has no hole, and no device can be blamed for it.
 #pragma once
 
+#include <cstddef>
 #include <cstdio>
-#include <initializer_list>
+#include <cstring>
 
 #include "foundation/integers.hpp"
 
@@ -21,28 +22,44 @@ int logPrintf(const char* format, ...) __attribute__((format(printf, 1, 2)));
 // Writes a line of the report, in the same way. Throws WriteFailedEx "File write failed".
 int reportPrintf(const char* format, ...) __attribute__((format(printf, 1, 2)));
 
-// What stands for one conversion of a line that logLine puts together.
-class LogField {
+// Puts a line of the trace together piece by piece, without printf: for the lines that make most of a log.
+// They are gathered, and go to the stream many at a time, before anything else does; a stream without a
+// buffer of its own gets each at once.
+class LogText {
 public:
-    // For "%s": a NUL-terminated text, which outlives the call.
-    LogField(const char* text) : mText(text) {} // NOLINT(google-explicit-constructor): a field of a list
-    // For "%u" and "%x".
-    LogField(uint32 number) : mNumber(number) {} // NOLINT(google-explicit-constructor): a field of a list
+    // A literal, whose length the compiler knows.
+    template <std::size_t Size>
+    LogText& text(const char (&literal)[Size]) noexcept {
+        return bytes(literal, Size - 1);
+    }
+    LogText& string(const char* text) noexcept { return bytes(text, std::strlen(text)); } // as "%s"
+    LogText& decimal(uint32 number) noexcept;                                             // as "%u"
+    LogText& hex(uint8 byte) noexcept;                                                    // as "%x"
 
-    const char* text() const { return mText; }
-    uint32 number() const { return mNumber; }
+    // Ends what was put together. Throws as logPrintf.
+    void write();
+
+    // The same for where no exception may leave: a text that the stream refuses is lost.
+    void writeNoThrow() noexcept;
 
 private:
-    const char* mText = nullptr;
-    uint32 mNumber = 0;
+    LogText& bytes(const char* text, std::size_t length) noexcept {
+        if (length > sizeof sGathered - sLength) {
+            return pass(text, length);
+        }
+        std::memcpy(sGathered + sLength, text, length);
+        sLength += length;
+        return *this;
+    }
+    LogText& pass(const char* text, std::size_t length) noexcept;
+
+    friend struct GatheredText;
+    static char sGathered[2048];
+    static std::size_t sLength;
 };
 
-// logPrintf for the lines that make most of a log: knows "%s", "%u" and "%x" alone, a field for each, and is
-// several times as fast. Throws as logPrintf.
-void logLine(const char* format, std::initializer_list<LogField> fields = {});
-
-// The same for where no exception may leave: a line that the stream refuses is lost.
-void logLineNoThrow(const char* format, std::initializer_list<LogField> fields = {}) noexcept;
+// Hands what is gathered to the stream, for somebody who writes to the stream itself. Throws as logPrintf.
+void passLog();
 
 // Hands everything written so far to the kernel. Called before whatever can wait (a command, a device, a
 // library), so that the log of a run that is killed there ends with it. Throws as logPrintf.

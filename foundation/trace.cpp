@@ -4,17 +4,22 @@
 
 namespace {
 
-constexpr const char* kEntry = "Entered Function %s Line %u\n";
-constexpr const char* kExit = "Left Function %s Line %u\n";
+LogText entryText(const char* name, unsigned line) noexcept {
+    return LogText().text("Entered Function ").string(name).text(" Line ").decimal(line).text("\n");
+}
+
+LogText exitText(const char* name, unsigned line) noexcept {
+    return LogText().text("Left Function ").string(name).text(" Line ").decimal(line).text("\n");
+}
 
 } // namespace
 
 void TRACE_ENTRY(const char* name, unsigned line) {
-    logLine(kEntry, {name, line});
+    entryText(name, line).write();
 }
 
 void TRACE_EXIT(const char* name, unsigned line) {
-    logLine(kExit, {name, line});
+    exitText(name, line).write();
 }
 
 FunctionTrace::FunctionTrace(const char* name, unsigned line) : mName(name), mThrows(true) {
@@ -23,21 +28,21 @@ FunctionTrace::FunctionTrace(const char* name, unsigned line) : mName(name), mTh
 
 FunctionTrace::FunctionTrace(std::nothrow_t /*tag*/, const char* name, unsigned line) noexcept
     : mName(name), mThrows(false) {
-    logLineNoThrow(kEntry, {name, line});
+    entryText(name, line).writeNoThrow();
 }
 
 void FunctionTrace::log(const char* text) const {
-    if (mThrows) {
-        logLine("%s", {text});
-    } else {
-        logLineNoThrow("%s", {text});
-    }
+    end(LogText().string(text));
 }
 
 void FunctionTrace::exit(unsigned line) const {
+    end(exitText(mName, line));
+}
+
+void FunctionTrace::end(LogText text) const {
     if (mThrows) {
-        TRACE_EXIT(mName, line);
+        text.write();
     } else {
-        logLineNoThrow(kExit, {mName, line});
+        text.writeNoThrow();
     }
 }

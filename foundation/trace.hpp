@@ -53,6 +53,8 @@ public:
     }
 
 private:
+    void end(LogText text) const;
+
     const char* mName;
     bool mThrows;
 };

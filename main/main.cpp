@@ -71,6 +71,15 @@ void run() {
     }
 }
 
+// The log up to a failure is what tells of it.
+void keepLog() noexcept {
+    try {
+        flushLog();
+    } catch (const WriteFailedEx&) {
+        return; // told by failureLine
+    }
+}
+
 // Why the run could not go on, as one line. A log that could not take something is behind whatever came of
 // it.
 std::string failureLine(const char* message) {
@@ -87,11 +96,13 @@ int main() {
         run();
         return EXIT_SUCCESS;
     } catch (const std::exception& exception) {
-        // Nothing stands between this failure and the end of the program; exit flushes the log so far.
+        // Nothing stands between this failure and the end of the program.
         clearProgress();
+        keepLog();
         static_cast<void>(std::fputs(failureLine(exception.what()).c_str(), stderr));
     } catch (...) {
         clearProgress();
+        keepLog();
         static_cast<void>(std::fputs("morvane: unknown exception\n", stderr));
     }
     return EXIT_FAILURE;

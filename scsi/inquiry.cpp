@@ -29,11 +29,12 @@ ZebScsiInquiry::Context makeContext() {
 
 template <typename Byte>
 void dumpBytes(uint32 count, Byte byteAt) {
-    logLine("Going to dump %u bytes\n", {count});
+    LogText text;
+    text.text("Going to dump ").decimal(count).text(" bytes\n");
     for (uint32 i = 0; i < count; ++i) {
-        logLine("Byte %u: 0x%x", {i, byteAt(i)});
+        text.text("Byte ").decimal(i).text(": 0x").hex(byteAt(i));
     }
-    logPrintf("\n");
+    text.text("\n").write();
 }
 
 void dumpBytes(const ResponseBytes& bytes, uint32 offset, uint32 count) {

@@ -4,7 +4,6 @@
 #include <memory>
 #include <string>
 
-#include "foundation/clib_stream.hpp"
 #include "foundation/exceptions.hpp"
 
 ZebString asciiText(const ResponseBytes& bytes, uint32 offset, uint32 count) {
@@ -20,12 +19,13 @@ ZebString asciiText(const ResponseBytes& bytes, uint32 offset, uint32 count) {
 }
 
 ZebString hexText(const ResponseBytes& bytes, uint32 offset, uint32 count) {
+    constexpr char kDigits[] = "0123456789ABCDEF";
     std::string text;
+    text.reserve(2 * static_cast<std::size_t>(count));
     for (uint32 i = 0; i < count; ++i) {
-        char digits[3] = {};
         const uint8 byte = bytes[offset + i];
-        Clib_snprintf(digits, sizeof digits, byte > 15 ? "%X" : "0%X", byte);
-        text += digits;
+        text += kDigits[byte >> 4];
+        text += kDigits[byte & 0x0F];
     }
     return {text.c_str()};
 }

@@ -1,6 +1,8 @@
-// floor RECORDING LOG: the floor under a run. Issues the recorded run's commands in their order and writes
-// its log with its fprintf calls, and does nothing else. Prints the CPU seconds that the reading of the
-// recording took, which are no part of the floor.
+// floor RECORDING LOG stdio|bytes: the floors under a run. Issues the recorded run's commands in their order
+// and writes its log, and does nothing else: as one fprintf call a text, without a flush (stdio), or as the
+// bytes that they come to, with one write between two commands (bytes). Prints the CPU seconds that the
+// preparation took (the reading of the recording, and for bytes the formatting), which are no part of the
+// floor.
 #include <fcntl.h>
 #include <scsi/sg.h>
 #include <sys/ioctl.h>
@@ -10,6 +12,8 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <string>
+#include <vector>
 
 #include "tests/bench/recording.hpp"
 
@@ -116,12 +120,95 @@ void replay(const char* position, const char* end, const char* texts, std::FILE*
     }
 }
 
+// The texts of a recording, formatted, between its commands.
+std::vector<std::string> formattedTexts(const char* position, const char* end, const char* texts) {
+    std::vector<std::string> result;
+    char* text = nullptr;
+    std::size_t size = 0;
+    std::FILE* stream = open_memstream(&text, &size);
+    const auto cut = [&] {
+        std::fclose(stream);
+        result.emplace_back(text, size);
+        std::free(text);
+        stream = open_memstream(&text, &size);
+    };
+    while (position < end) {
+        switch (take<std::uint8_t>(position)) {
+        case kPrint:
+            print(stream, position, texts);
+            break;
+        case kPrintDoubles:
+            printDoubles(stream, position, texts);
+            break;
+        case kOpen:
+            position += sizeof(std::uint32_t);
+            break;
+        case kClose:
+            break;
+        case kSgIo:
+            position += 1 + static_cast<unsigned char>(*position) + sizeof(std::uint32_t);
+            cut();
+            break;
+        default:
+            std::abort();
+        }
+    }
+    cut();
+    std::fclose(stream);
+    std::free(text);
+    return result;
+}
+
+void writeAll(int fd, const std::string& text) {
+    for (std::size_t written = 0; written < text.size();) {
+        const ssize_t count = write(fd, text.data() + written, text.size() - written);
+        if (count < 0) {
+            fail("write");
+        }
+        written += static_cast<std::size_t>(count);
+    }
+}
+
+void replayBytes(const char* position, const char* end, const char* texts,
+                 const std::vector<std::string>& text, int log) {
+    int fd = -1;
+    std::size_t next = 0;
+    while (position < end) {
+        switch (take<std::uint8_t>(position)) {
+        case kPrint: {
+            const auto count = take<std::uint8_t>(position);
+            position += sizeof(std::uint32_t) + 1 + count * sizeof(std::uint64_t);
+            break;
+        }
+        case kPrintDoubles: {
+            const auto count = take<std::uint8_t>(position);
+            position += sizeof(std::uint32_t) + count * sizeof(double);
+            break;
+        }
+        case kOpen:
+            fd = open(texts + take<std::uint32_t>(position), O_RDONLY | O_NONBLOCK);
+            break;
+        case kClose:
+            close(fd);
+            break;
+        case kSgIo:
+            writeAll(log, text[next++]);
+            sgIo(fd, position);
+            break;
+        default:
+            std::abort();
+        }
+    }
+    writeAll(log, text[next]);
+}
+
 } // namespace
 
 int main(int argc, char** argv) {
-    if (argc != 3) {
+    if (argc != 4) {
         return 2;
     }
+    const bool isBytes = std::strcmp(argv[3], "bytes") == 0;
     const double start = cpuSeconds();
     const int recording = open(argv[1], O_RDONLY);
     Header header{};
@@ -138,12 +225,21 @@ int main(int argc, char** argv) {
         filled += static_cast<std::size_t>(count);
     }
     close(recording);
+    const char* const end = content + header.eventBytes;
+    std::vector<std::string> texts;
+    if (isBytes) {
+        texts = formattedTexts(content, end, end);
+    }
     std::printf("%.6f\n", cpuSeconds() - start);
 
     std::FILE* const log = std::fopen(argv[2], "w+");
     if (log == nullptr) {
         fail(argv[2]);
     }
-    replay(content, content + header.eventBytes, content + header.eventBytes, log);
+    if (isBytes) {
+        replayBytes(content, end, end, texts, fileno(log));
+    } else {
+        replay(content, end, end, log);
+    }
     return 0;
 }

@@ -80,13 +80,6 @@ __attribute__((constructor)) void begin() {
     }
 }
 
-__attribute__((destructor)) void end() {
-    if (gRecorder != nullptr) {
-        gProgramEnd = 0; // nothing of this counts
-        gRecorder->save(gPath);
-    }
-}
-
 template <typename Function>
 Function* real(Function* /*own*/, const char* name) {
     return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
@@ -145,13 +138,89 @@ void recordPrint(const char* format, va_list arguments) {
     gRecorder->bytes(values, count * sizeof values[0]);
 }
 
+void recordFormat(const char* format, ...) {
+    va_list arguments;
+    va_start(arguments, format);
+    recordPrint(format, arguments);
+    va_end(arguments);
+}
+
+std::string gGathered; // of texts that Morvane puts together itself
+
+// The length of the text that `gathered` begins with: a byte of a dump, or what ends with a line feed.
+std::size_t textLength(const std::string& gathered) {
+    constexpr const char* kDigits = "0123456789abcdef";
+    if (gathered.rfind("Byte ", 0) == 0) {
+        const std::size_t value = gathered.find(": 0x");
+        return value == std::string::npos ? value : gathered.find_first_not_of(kDigits, value + 4);
+    }
+    const std::size_t end = gathered.find('\n');
+    return end == std::string::npos ? end : end + 1;
+}
+
+// Records a text as the fprintf call that would write it.
+void recordText(const std::string& text) {
+    unsigned number = 0;
+    unsigned value = 0;
+    const std::size_t line = text.rfind(" Line ");
+    for (const char* const format : {"Entered Function %s Line %u\n", "Left Function %s Line %u\n"}) {
+        const std::string before(format, std::strchr(format, '%'));
+        if (text.rfind(before, 0) == 0 && line != std::string::npos) {
+            const std::string function = text.substr(before.size(), line - before.size());
+            recordFormat(format, function.c_str(), std::strtoul(text.c_str() + line + 6, nullptr, 10));
+            return;
+        }
+    }
+    if (std::sscanf(text.c_str(), "Byte %u: 0x%x", &number, &value) == 2) {
+        recordFormat("Byte %u: 0x%x", number, value);
+    } else if (std::sscanf(text.c_str(), "Going to dump %u bytes", &number) == 1) {
+        recordFormat("Going to dump %u bytes\n", number);
+    } else if (text.find('%') == std::string::npos) {
+        recordFormat(text.c_str());
+    } else {
+        recordFormat("%s", text.c_str());
+    }
+}
+
+// Records what was gathered, before whatever comes behind it.
+void recordGathered() {
+    while (!gGathered.empty()) {
+        const std::string text = gGathered.substr(0, textLength(gGathered));
+        gGathered.erase(0, text.size());
+        recordText(text);
+    }
+}
+
+__attribute__((destructor)) void end() {
+    if (gRecorder != nullptr) {
+        gProgramEnd = 0; // nothing of this counts
+        recordGathered();
+        gRecorder->save(gPath);
+    }
+}
+
+bool isDevice(const char* path) {
+    return std::strncmp(path, "/dev/", 5) == 0 && std::strcmp(path, "/dev/null") != 0;
+}
+
+int gDevice = -1; // the node that is open
+
 } // namespace
 
 extern "C" {
 
+std::size_t fwrite_unlocked(const void* text, std::size_t size, std::size_t count, std::FILE* stream) {
+    static auto* const sReal = real(&fwrite_unlocked, "fwrite_unlocked");
+    if (isOwnCall(__builtin_return_address(0))) {
+        gGathered.append(static_cast<const char*>(text), size * count);
+    }
+    return sReal(text, size, count, stream);
+}
+
 int __vfprintf_chk(std::FILE* stream, int flag, const char* format, va_list arguments) {
     static auto* const sReal = real(&__vfprintf_chk, "__vfprintf_chk");
     if (stream != stdout && isOwnCall(__builtin_return_address(0))) {
+        recordGathered();
         va_list copy;
         va_copy(copy, arguments);
         recordPrint(format, copy);
@@ -164,17 +233,21 @@ int __vfprintf_chk(std::FILE* stream, int flag, const char* format, va_list argu
 int open(const char* path, int flags, ...) {
     static auto* const sReal = real(&open, "open");
     const int fd = sReal(path, flags, 0);
-    if (fd >= 0 && isOwnCall(__builtin_return_address(0))) {
+    if (fd >= 0 && isDevice(path) && isOwnCall(__builtin_return_address(0))) {
+        recordGathered();
         gRecorder->number(kOpen, 1);
         gRecorder->number(gRecorder->text(path), 4);
+        gDevice = fd;
     }
     return fd;
 }
 
 int close(int fd) {
     static auto* const sReal = real(&close, "close");
-    if (isOwnCall(__builtin_return_address(0))) {
+    if (fd == gDevice && isOwnCall(__builtin_return_address(0))) {
+        recordGathered();
         gRecorder->number(kClose, 1);
+        gDevice = -1;
     }
     return sReal(fd);
 }
@@ -185,7 +258,8 @@ int ioctl(int fd, unsigned long request, ...) noexcept {
     va_start(arguments, request);
     auto* const header = va_arg(arguments, sg_io_hdr*);
     va_end(arguments);
-    if (isOwnCall(__builtin_return_address(0))) {
+    if (fd == gDevice && isOwnCall(__builtin_return_address(0))) {
+        recordGathered();
         gRecorder->number(kSgIo, 1);
         gRecorder->number(header->cmd_len, 1);
         gRecorder->bytes(header->cmdp, header->cmd_len);

@@ -74,18 +74,22 @@ public:
     void record() {
         onHost({"/usr/bin/env", "LD_PRELOAD=" + mPrograms.recorder, "MORVANE_RECORDING=" + path("recording"),
                 mPrograms.morvane});
-        floor();
-        if (test::contentOf(path("floor.log")) != test::contentOf(path("MorvaneLogs/Morvane.log"))) {
-            throw std::runtime_error("the floor's log is not the recorded run's");
+        for (const char* const kind : {"stdio", "bytes"}) {
+            floor(kind);
+            if (test::contentOf(path("floor.log")) != test::contentOf(path("MorvaneLogs/Morvane.log"))) {
+                throw std::runtime_error(std::string("the log of the floor of ") + kind +
+                                         " is not the recorded run's");
+            }
         }
     }
 
     Sample morvane() { return launched({mPrograms.morvane}); }
 
-    Sample floor() {
+    // The floor of `kind`: stdio or bytes.
+    Sample floor(const char* kind) {
         std::string output;
-        Sample sample = launched({mPrograms.floor, path("recording"), path("floor.log")}, &output);
-        sample.ownSeconds -= std::stod(output); // the reading of the recording
+        Sample sample = launched({mPrograms.floor, path("recording"), path("floor.log"), kind}, &output);
+        sample.ownSeconds -= std::stod(output); // the preparation
         return sample;
     }
 
@@ -194,30 +198,35 @@ void printReadings(const std::vector<Reading>& readings) {
 void measureSizes(const Programs& programs, const std::vector<unsigned>& sizes) {
     std::vector<Reading> readings;
     std::cout
-        << "| LUNs | log MB | morvane ms | in children | floor ms | ratio | morvane us/LUN | floor us/LUN "
-           "| peak KiB | KiB a LUN beyond the first row |\n|---|---|---|---|---|---|---|---|---|---|\n";
+        << "| LUNs | log MB | morvane ms | in children | stdio floor ms | ratio | bytes floor ms | ratio "
+           "| morvane us/LUN | peak KiB | KiB a LUN beyond the first row |\n"
+           "|---|---|---|---|---|---|---|---|---|---|---|\n";
     long firstPeakKib = 0;
     for (const unsigned luns : sizes) {
         const unsigned rounds = std::clamp(20000U / luns, 5U, 40U);
         Bench bench(programs, luns);
         bench.record();
         std::vector<Sample> morvane;
-        std::vector<Sample> floor;
+        std::vector<Sample> stdio;
+        std::vector<Sample> bytes;
         for (unsigned round = 0; round < rounds; ++round) {
             morvane.push_back(bench.morvane());
-            floor.push_back(bench.floor());
+            stdio.push_back(bench.floor("stdio"));
+            bytes.push_back(bench.floor("bytes"));
         }
         const Sample& own = best(morvane);
-        const Sample& least = best(floor);
+        const Sample& plain = best(stdio);
+        const Sample& least = best(bytes);
         if (luns == sizes.front()) {
             firstPeakKib = own.peakKib;
         }
         const double moreLuns = std::max(1.0, static_cast<double>(luns) - sizes.front());
         std::cout << "| " << luns << std::fixed << std::setprecision(2) << " | "
                   << static_cast<double>(bench.logBytes()) / 1e6 << " | " << milliseconds(own.ownSeconds)
-                  << " | " << milliseconds(own.childSeconds) << " | " << milliseconds(least.ownSeconds)
+                  << " | " << milliseconds(own.childSeconds) << " | " << milliseconds(plain.ownSeconds)
+                  << " | " << own.ownSeconds / plain.ownSeconds << " | " << milliseconds(least.ownSeconds)
                   << " | " << own.ownSeconds / least.ownSeconds << " | " << own.ownSeconds / luns * 1e6
-                  << " | " << least.ownSeconds / luns * 1e6 << " | " << own.peakKib << " | "
+                  << " | " << own.peakKib << " | "
                   << static_cast<double>(own.peakKib - firstPeakKib) / moreLuns << " |" << std::endl;
         readings.push_back(measureReading(bench, luns, rounds));
     }

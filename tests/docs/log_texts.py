@@ -44,6 +44,15 @@ def banner_lines(source):
         yield title[:-1] + r'\n"'
 
 
+def chained_texts(source):
+    """The texts that are put together piece by piece, as printf would have them."""
+    piece = rf"\s*\.(text|string|decimal|hex)\(({LITERAL}|[^()]*(?:\([^()]*\))?)\)"
+    for chain in re.findall(rf"\b(?:text|line)((?:{piece})+)", source):
+        pieces = re.findall(piece, chain[0])
+        yield '"' + "".join({"text": value[1:-1], "string": "%s", "decimal": "%u", "hex": "%x"}[kind]
+                            for kind, value in pieces) + '"'
+
+
 def form(text):
     """What the reader and the page have in common of a text: the line ends before it and the empty lines behind it
     are not part of it, a text field reads an address as well, and a sign, a width or a precision is no matter."""
@@ -82,6 +91,9 @@ def main():
         calls = (rf"\b(?:(?:log|report)Printf(?:NoThrow)?\(|Clib_fprintf\(stream,|trace\.log\(|logAndFail<\w+>\("
                  rf"|failAfterExit<\w+>\(trace, \w+,)\s*({LITERAL})")
         logged.update(re.findall(calls, text))
+        chained = set(chained_texts(text)) - CARRIERS - PIECES
+        literals.update(chained)
+        logged.update(chained)
     missing = sorted(quoted - literals)
     unquoted = sorted(logged - quoted - CARRIERS)
     for text in missing:

@@ -51,10 +51,13 @@ TEST(LogPrintf, FlushesNothing) {
     std::size_t size = 0;
     gLogStream = open_memstream(&text, &size);
     logPrintf("line\n");
+    logPrintf("%s", "next\n");
+    EXPECT_EQ(size, 0U);
+    passLog();
     EXPECT_EQ(size, 0U);
     static_cast<void>(std::fclose(gLogStream));
     gLogStream = nullptr;
-    EXPECT_EQ(std::string(text, size), "line\n");
+    EXPECT_EQ(std::string(text, size), "line\nnext\n");
     std::free(text);
 }
 
@@ -68,27 +71,27 @@ TEST(ReportPrintf, WritesAsLogPrintfAndFailsWithAMessageOfItsOwn) {
     EXPECT_EQ(messageOf<WriteFailedEx>([] { reportPrintf("line\n"); }), "File write failed");
 }
 
-TEST(LogLine, PutsTextsAndNumbersIntoTheirPlaces) {
+TEST(LogText, WritesTextsAndNumbersAsPrintfDoes) {
     const LogCapture log;
-    logLine("Entered Function %s Line %u\n", {"sense", 168U});
-    logLine("Byte %u: 0x%x", {4294967295U, 255U});
-    logLine("Byte %u: 0x%x", {0U, 0U});
-    logLine("\n");
-    EXPECT_EQ(log.exactText(), "Entered Function sense Line 168\nByte 4294967295: 0xffByte 0: 0x0\n");
+    LogText text;
+    text.text("Entered Function ").string("sense").text(" Line ").decimal(168).text("\n");
+    for (const uint32 number : {0U, 9U, 10U, 4294967295U}) {
+        text.decimal(number).text(" ");
+    }
+    for (const uint8 byte : std::initializer_list<uint8>{0, 0x0f, 0x10, 0xff}) {
+        text.hex(byte).text(" ");
+    }
+    text.write();
+    EXPECT_EQ(log.exactText(), "Entered Function sense Line 168\n0 9 10 4294967295 0 f 10 ff ");
 }
 
-TEST(LogLine, WritesAPercentSignOfAText) {
-    const LogCapture log;
-    logLine("%s", {"100% of %u\n"});
-    EXPECT_EQ(log.exactText(), "100% of %u\n");
-}
-
-TEST(LogLine, TakesTextsOfAnyLength) {
-    for (const std::size_t length : {0U, 1U, 254U, 255U, 256U, 257U, 511U, 512U, 100000U}) {
+TEST(LogText, TakesTextsOfAnyLength) {
+    for (const std::size_t length : {0U, 1U, 510U, 511U, 512U, 513U, 1023U, 1024U, 100000U}) {
         const LogCapture log;
-        const std::string text(length, 'x');
-        logLine("a%sb%sc", {text.c_str(), text.c_str()});
-        EXPECT_EQ(log.exactText(), "a" + text + "b" + text + "c");
+        const std::string string(length, 'x');
+        LogText text;
+        text.text("a").string(string.c_str()).text("b").string(string.c_str()).text("c").write();
+        EXPECT_EQ(log.exactText(), "a" + string + "b" + string + "c");
     }
 }
 
@@ -99,8 +102,8 @@ TEST(Log, TakesNothingBehindTheFirstTextThatWasRefused) {
     EXPECT_EQ(logError(), ENOSPC);
     EXPECT_EQ(messageOf<WriteFailedEx>([] { logPrintf("three\n"); }), kRefused);
     EXPECT_EQ(messageOf<WriteFailedEx>([] { reportPrintf("four\n"); }), "File write failed");
-    EXPECT_EQ(messageOf<WriteFailedEx>([] { logLine("five\n"); }), kRefused);
-    logLineNoThrow("six\n");
+    EXPECT_EQ(messageOf<WriteFailedEx>([] { LogText().text("five\n").write(); }), kRefused);
+    LogText().text("six\n").writeNoThrow();
     EXPECT_EQ(messageOf<WriteFailedEx>([] { flushLog(); }), kRefused);
     EXPECT_EQ(log.refusals(), 1);
 }
@@ -117,6 +120,26 @@ TEST(Log, IsWithTheKernelOnceItIsFlushed) {
     EXPECT_EQ(text, "line");
     static_cast<void>(std::fclose(gLogStream));
     gLogStream = nullptr;
+}
+
+TEST(Log, KeepsTheOrderOfLinesThatAreFormattedAndOnesThatAreNot) {
+    const LogCapture log;
+    LogText().text("one\n").write();
+    logPrintf("%s\n", "two");
+    logPrintf("three\n");
+    reportPrintf("four\n");
+    LogText().text("five\n").writeNoThrow();
+    passLog();
+    static_cast<void>(std::fputs("six\n", gLogStream));
+    logPrintf("seven\n");
+    EXPECT_EQ(log.exactText(), "one\ntwo\nthree\nfour\nfive\nsix\nseven\n");
+}
+
+TEST(Log, GoesAtOnceToAStreamWithoutABuffer) {
+    testing::internal::CaptureStderr();
+    ASSERT_EQ(gLogStream, nullptr);
+    logPrintf("line\n");
+    EXPECT_EQ(testing::internal::GetCapturedStderr(), "line\n");
 }
 
 } // namespace

@@ -27,10 +27,14 @@ inline std::string withoutLineNumbers(std::string text) {
 // Stands in for the log while it lives.
 class LogCapture {
 public:
-    LogCapture() : mPrevious(gLogStream), mStream(open_memstream(&mText, &mSize)) { gLogStream = mStream; }
+    LogCapture() : mPrevious(gLogStream), mStream(open_memstream(&mText, &mSize)) {
+        passLog(); // what belongs to the stream before this one
+        gLogStream = mStream;
+    }
     LogCapture(const LogCapture&) = delete;
     LogCapture& operator=(const LogCapture&) = delete;
     ~LogCapture() {
+        passLog();
         gLogStream = mPrevious;
         static_cast<void>(std::fclose(mStream));
         std::free(mText);
@@ -38,7 +42,7 @@ public:
 
     // Everything written so far, byte by byte.
     std::string exactText() const {
-        static_cast<void>(std::fflush(mStream));
+        flushLog();
         return {mText, mSize};
     }
 
