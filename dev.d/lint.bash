@@ -1,0 +1,36 @@
+# shellcheck shell=bash
+# ./dev lint and ./dev format: how sources, scripts and manual pages look.
+
+lint_packages=(clang-format clang-tidy shellcheck man-db groff-base)
+
+# The C++ sources of the project, one a line.
+sources() {
+    git ls-files --cached --others --exclude-standard '*.cpp' '*.hpp'
+}
+
+cmd_lint() {
+    need "${run_packages[@]}" "${test_packages[@]}" "${lint_packages[@]}"
+    cmake --preset debug -DMORVANE_TESTS=ON >/dev/null
+    cmake --build --preset debug -- --quiet view/view/page_template.hpp # a source includes it
+    sources | xargs clang-format --dry-run --Werror
+    sources | grep '\.cpp$' | xargs -P "$(nproc)" -n 4 clang-tidy --quiet -p build/debug 2>/dev/null
+    shellcheck -x -a dev # with all it sources
+    shellcheck .ci/run tests/hardening/check.sh tests/packages/install_and_run view/morvane-view.bash
+    (cd lab/guest && shellcheck -x ../build-guest init course ./*.sh)
+    lint_manual
+    echo "lint: clean"
+}
+
+# Whatever man has to say about a manual page is too much.
+lint_manual() {
+    local page warnings
+    for page in docs/*.[1-8] view/*.[1-8]; do
+        warnings=$(LC_ALL=C.UTF-8 MANWIDTH=80 man --warnings --local-file "$page" 2>&1 >/dev/null)
+        [ -z "$warnings" ] || { printf '%s\n' "$warnings" >&2; return 1; }
+    done
+}
+
+cmd_format() {
+    need "${lint_packages[@]}"
+    sources | xargs clang-format -i
+}
