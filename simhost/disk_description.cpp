@@ -1,0 +1,218 @@
+#include <charconv>
+#include <cstring>
+
+#include "simhost/description_parts.hpp"
+
+namespace simhost {
+namespace {
+
+int commandOf(std::string_view text, const toml::node& node, const std::string& where) {
+    if (text == "standard") {
+        return standardInquiry;
+    }
+    unsigned page = 0;
+    if (text.size() > 2 && text.substr(0, 2) == "0x") {
+        const auto [end, error] = std::from_chars(text.data() + 2, text.data() + text.size(), page, 16);
+        if (error == std::errc() && end == text.data() + text.size() && page <= 0xff) {
+            return static_cast<int>(page);
+        }
+    }
+    refuse(node, where,
+           R"(a command is "standard" or a page such as "0x83", not ")" + std::string(text) + "\"");
+}
+
+int errorNumberOf(const toml::node& node, const std::string& where) {
+    if (const auto number = node.value_exact<std::int64_t>(); number && *number > 0 && *number < 4096) {
+        return static_cast<int>(*number);
+    }
+    if (const auto name = node.value_exact<std::string>()) {
+        for (int number = 1; number < 200; ++number) {
+            if (const char* known = strerrorname_np(number); known != nullptr && *name == known) {
+                return number;
+            }
+        }
+    }
+    refuse(node, where, "must be the name or number of a system error");
+}
+
+Fault faultOf(const toml::table& table, const std::string& where) {
+    Keys keys(table, where);
+    Fault fault;
+    if (const toml::node* command = keys.find("command")) {
+        fault.command = commandOf(command->value_or(std::string_view()), *command, where);
+    }
+    const auto nth = keys.number("nth");
+    const auto from = keys.number("from");
+    if (nth && from) {
+        refuse(table, where, R"(has both "nth" and "from")");
+    }
+    if (nth) {
+        fault.first = fault.last = static_cast<std::uint32_t>(*nth);
+    }
+    if (from) {
+        fault.first = static_cast<std::uint32_t>(*from);
+    }
+    if (const toml::node* error = keys.find("errno")) {
+        fault.errorNumber = errorNumberOf(*error, where);
+    }
+    fault.delayMilliseconds = keys.number32("delay_ms", 0);
+    const auto status = keys.number("status", 0xff);
+    const auto hostStatus = keys.number("host_status", 0xffff);
+    const auto driverStatus = keys.number("driver_status", 0xffff);
+    const auto sense = keys.hex("sense");
+    fault.failed = status || hostStatus || driverStatus || sense;
+    fault.status = static_cast<std::uint8_t>(status.value_or(0));
+    fault.hostStatus = static_cast<std::uint16_t>(hostStatus.value_or(0));
+    fault.driverStatus = static_cast<std::uint16_t>(driverStatus.value_or(0));
+    fault.sense = sense.value_or("");
+    if (const auto length = keys.number("sense_length", 0xff)) {
+        fault.senseLength = static_cast<std::uint8_t>(*length);
+    }
+    fault.data = keys.hex("data");
+    if (const toml::node* resid = keys.find("resid")) {
+        const auto value = resid->value_exact<std::int64_t>();
+        if (!value || *value < INT32_MIN || *value > INT32_MAX) {
+            refuse(*resid, where + ".resid", "must be a 32-bit number");
+        }
+        fault.resid = static_cast<std::int32_t>(*value);
+    }
+    keys.refuseUnknown();
+    return fault;
+}
+
+// A field of a fixed width, blank-padded and cut as SPC's left-aligned ASCII fields are.
+Bytes padded(const Bytes& text, std::size_t width) {
+    Bytes field = text.substr(0, width);
+    field.resize(width, ' ');
+    return field;
+}
+
+char byteOf(std::uint64_t value) {
+    return static_cast<char>(static_cast<unsigned char>(value & 0xffU));
+}
+
+Bytes standardData(Keys& keys, char type) {
+    const Bytes tail = keys.hex("tail").value_or("");
+    const std::uint64_t additional = keys.number("additional_length", 0xff).value_or(31 + tail.size());
+    Bytes data{type, 0, 5, 2, byteOf(additional), 0, 0, 2};
+    data += padded(keys.bytes("vendor").value_or(""), 8);
+    data += padded(keys.bytes("product").value_or(""), 16);
+    data += padded(keys.bytes("revision").value_or(""), 4);
+    return data + tail;
+}
+
+Bytes pageOf(char type, std::uint8_t page, const Bytes& body) {
+    return Bytes{type, byteOf(page), byteOf(body.size() >> 8U), byteOf(body.size())} + body;
+}
+
+Bytes designatorOf(const toml::table& table, const std::string& where) {
+    Keys keys(table, where);
+    keys.require("type");
+    const std::uint64_t type = keys.number("type", 15).value_or(0);
+    const std::uint64_t association = keys.number("association", 3).value_or(0);
+    const auto text = keys.string("text");
+    const auto hex = keys.hex("hex");
+    if (text.has_value() == hex.has_value()) {
+        refuse(table, where, R"(needs either "text" or "hex")");
+    }
+    const std::uint64_t codeSet = keys.number("code_set", 15).value_or(text ? 2 : 1);
+    keys.refuseUnknown();
+    const Bytes& identifier = text ? *text : *hex;
+    if (identifier.size() > 0xff) {
+        refuse(table, where, "a designator has at most 255 bytes");
+    }
+    return Bytes{byteOf(codeSet), byteOf(association << 4U | type), 0, byteOf(identifier.size())} +
+           identifier;
+}
+
+void addRawAnswers(Keys& keys, Disk& disk) {
+    const toml::node* raw = keys.find("raw");
+    if (raw == nullptr) {
+        return;
+    }
+    const std::string where = keys.where() + ".raw";
+    if (!raw->is_table()) {
+        refuse(*raw, where, "must be a table");
+    }
+    for (auto&& [key, value] : *raw->as_table()) {
+        disk.answers[commandOf(key.str(), value, where)] =
+            bytesOfHex(value.value_or(std::string_view("not a string")), where);
+    }
+}
+
+std::vector<std::string> nodesOf(Keys& keys) {
+    const toml::node& node = keys.require("node");
+    std::vector<std::string> nodes;
+    if (node.is_string()) {
+        nodes.push_back(node.as_string()->get());
+    } else if (node.is_array()) {
+        for (const auto& element : *node.as_array()) {
+            nodes.push_back(element.value_or(std::string()));
+        }
+    }
+    if (nodes.empty()) {
+        refuse(node, keys.where() + ".node", "must be a path or a list of paths");
+    }
+    for (const auto& path : nodes) {
+        if (path.rfind("/dev/", 0) != 0 || path.size() == 5) {
+            refuse(node, keys.where() + ".node", "must stand under /dev: \"" + path + "\"");
+        }
+    }
+    return nodes;
+}
+
+Disk diskOf(const toml::table& table, const std::string& where) {
+    Keys keys(table, where);
+    Disk disk;
+    disk.nodes = nodesOf(keys);
+    if (const auto error = keys.string("open_error")) {
+        if (*error == "ENOENT") {
+            disk.open = Disk::Open::NoEntry;
+        } else if (*error == "ENXIO") {
+            disk.open = Disk::Open::NoDevice;
+        } else if (*error == "ELOOP") {
+            disk.open = Disk::Open::LinkLoop;
+        } else {
+            refuse(table, where, R"(open_error must be "ENOENT", "ENXIO" or "ELOOP")");
+        }
+    }
+    const char type = byteOf(keys.number("type", 0xff).value_or(0));
+    disk.answers[standardInquiry] = standardData(keys, type);
+    if (const auto serial = keys.bytes("serial")) {
+        disk.answers[0x80] = pageOf(type, 0x80, *serial);
+    }
+    if (const toml::array* designators = keys.array("designators")) {
+        Bytes list;
+        for (const auto& designator : *designators) {
+            if (!designator.is_table()) {
+                refuse(designator, where + ".designators", "must hold tables");
+            }
+            list += designatorOf(*designator.as_table(), where + ".designators");
+        }
+        disk.answers[0x83] = pageOf(type, 0x83, list);
+    }
+    addRawAnswers(keys, disk);
+    disk.ignoresAllocationLength = keys.boolean("ignores_allocation_length").value_or(false);
+    if (const toml::array* faults = keys.array("faults")) {
+        for (const auto& fault : *faults) {
+            if (!fault.is_table()) {
+                refuse(fault, where + ".faults", "must hold tables");
+            }
+            disk.faults.push_back(faultOf(*fault.as_table(), where + ".faults"));
+        }
+    }
+    keys.refuseUnknown();
+    return disk;
+}
+
+} // namespace
+
+std::vector<Disk> disksOf(Keys& host) {
+    std::vector<Disk> disks;
+    for (const auto& table : host.tables("disk")) {
+        disks.push_back(diskOf(table, "disk " + std::to_string(disks.size())));
+    }
+    return disks;
+}
+
+} // namespace simhost
