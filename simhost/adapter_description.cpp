@@ -57,12 +57,24 @@ void addTarget(const toml::table& table, const std::string& where, std::vector<M
     lun.bus = keys.number32("bus", 0);
     lun.target = keys.number32("id", 0);
     lun.fcId = keys.number32("fcid", 0);
-    if (const toml::array* list = keys.array("luns")) {
-        for (std::size_t i = 0; i < list->size(); ++i) {
-            addLun(*list->get(i), where + ".luns", lun, luns, static_cast<std::uint32_t>(i));
-        }
+    std::uint32_t place = 0;
+    for (const auto& entry : keys.array("luns")) {
+        addLun(entry, where + ".luns", lun, luns, place++);
     }
     keys.refuseUnknown();
+}
+
+MappingDeviation deviationOf(const toml::table& table, const std::string& where) {
+    Keys keys(table, where);
+    MappingDeviation deviation;
+    if (const auto status = keys.number("status")) {
+        deviation.status = static_cast<std::uint32_t>(*status);
+    }
+    if (const auto entries = keys.number("entries")) {
+        deviation.entries = static_cast<std::uint32_t>(*entries);
+    }
+    keys.refuseUnknown();
+    return deviation;
 }
 
 Adapter adapterOf(const toml::table& table, std::size_t index) {
@@ -76,37 +88,20 @@ Adapter adapterOf(const toml::table& table, std::size_t index) {
     adapter.manufacturer = keys.bytes("manufacturer").value_or("");
     adapter.model = keys.bytes("model").value_or("");
     adapter.nodeWwn = wwnOf(keys, "wwnn", table);
-    if (const toml::array* ports = keys.array("ports")) {
-        for (const auto& port : *ports) {
-            adapter.ports.push_back(wwnOf(port.value_or(std::string()), port, where + ".ports"));
-        }
+    for (const auto& port : keys.array("ports")) {
+        adapter.ports.push_back(wwnOf(stringOf(port, where + ".ports"), port, where + ".ports"));
     }
     adapter.nameStatus = keys.number32("name_status", 0);
     adapter.opens = keys.boolean("open").value_or(true);
     adapter.attributesStatus = keys.number32("attributes_status", 0);
     adapter.numberOfPorts =
         keys.number32("number_of_ports", static_cast<std::uint32_t>(adapter.ports.size()));
-    if (const toml::array* statuses = keys.array("port_status")) {
-        for (const auto& status : *statuses) {
-            adapter.portStatus.push_back(status.value_or(std::uint32_t{0}));
-        }
+    for (const auto& status : keys.array("port_status")) {
+        adapter.portStatus.push_back(static_cast<std::uint32_t>(numberOf(status, where + ".port_status")));
     }
     adapter.portStatus.resize(std::max(adapter.portStatus.size(), adapter.ports.size()));
-    if (const toml::array* deviations = keys.array("mapping")) {
-        for (const auto& deviation : *deviations) {
-            if (!deviation.is_table()) {
-                refuse(deviation, where + ".mapping", "must hold tables");
-            }
-            Keys deviationKeys(*deviation.as_table(), where + ".mapping");
-            MappingDeviation& added = adapter.mapping.emplace_back();
-            if (const auto status = deviationKeys.number("status")) {
-                added.status = static_cast<std::uint32_t>(*status);
-            }
-            if (const auto entries = deviationKeys.number("entries")) {
-                added.entries = static_cast<std::uint32_t>(*entries);
-            }
-            deviationKeys.refuseUnknown();
-        }
+    for (const auto& deviation : keys.array("mapping")) {
+        adapter.mapping.push_back(deviationOf(tableOf(deviation, where + ".mapping"), where + ".mapping"));
     }
     for (const auto& target : keys.tables("target")) {
         addTarget(target, where + ".target", adapter.luns);
@@ -126,19 +121,16 @@ std::vector<Adapter> adaptersOf(Keys& host) {
 }
 
 std::optional<VendorLibrary> vendorLibraryOf(Keys& host, std::size_t adapters) {
-    const toml::node* node = host.find("fc");
-    if (node == nullptr && adapters == 0) {
+    const toml::table* table = host.table("fc");
+    if (table == nullptr && adapters == 0) {
         return std::nullopt;
     }
     VendorLibrary library;
     library.numberOfAdapters = static_cast<std::uint32_t>(adapters);
-    if (node == nullptr) {
+    if (table == nullptr) {
         return library;
     }
-    if (!node->is_table()) {
-        refuse(*node, "fc", "must be a table");
-    }
-    Keys keys(*node->as_table(), "fc");
+    Keys keys(*table, "fc");
     library.loadStatus = keys.number32("load_status", 0);
     library.registerStatus = keys.number32("register_status", 0);
     library.numberOfAdapters = keys.number32("adapters", library.numberOfAdapters);

@@ -39,12 +39,15 @@ Fault faultOf(const toml::table& table, const std::string& where) {
     Keys keys(table, where);
     Fault fault;
     if (const toml::node* command = keys.find("command")) {
-        fault.command = commandOf(command->value_or(std::string_view()), *command, where);
+        fault.command = commandOf(stringOf(*command, where + ".command"), *command, where);
     }
     const auto nth = keys.number("nth");
     const auto from = keys.number("from");
     if (nth && from) {
         refuse(table, where, R"(has both "nth" and "from")");
+    }
+    if (nth == 0U || from == 0U) {
+        refuse(table, where, "commands count from 1");
     }
     if (nth) {
         fault.first = fault.last = static_cast<std::uint32_t>(*nth);
@@ -55,7 +58,7 @@ Fault faultOf(const toml::table& table, const std::string& where) {
     if (const toml::node* error = keys.find("errno")) {
         fault.errorNumber = errorNumberOf(*error, where);
     }
-    fault.delayMilliseconds = keys.number32("delay_ms", 0);
+    fault.delayMilliseconds = static_cast<std::uint32_t>(keys.number("delay_ms", INT32_MAX).value_or(0));
     const auto status = keys.number("status", 0xff);
     const auto hostStatus = keys.number("host_status", 0xffff);
     const auto driverStatus = keys.number("driver_status", 0xffff);
@@ -93,7 +96,11 @@ char byteOf(std::uint64_t value) {
 
 Bytes standardData(Keys& keys, char type) {
     const Bytes tail = keys.hex("tail").value_or("");
-    const std::uint64_t additional = keys.number("additional_length", 0xff).value_or(31 + tail.size());
+    const auto given = keys.number("additional_length", 0xff);
+    const std::uint64_t additional = given.value_or(31 + tail.size());
+    if (additional > 0xff) {
+        throw DescriptionError(keys.where() + ": a tail of more than 224 bytes needs \"additional_length\"");
+    }
     Bytes data{type, 0, 5, 2, byteOf(additional), 0, 0, 2};
     data += padded(keys.bytes("vendor").value_or(""), 8);
     data += padded(keys.bytes("product").value_or(""), 16);
@@ -101,7 +108,10 @@ Bytes standardData(Keys& keys, char type) {
     return data + tail;
 }
 
-Bytes pageOf(char type, std::uint8_t page, const Bytes& body) {
+Bytes pageOf(char type, std::uint8_t page, const Bytes& body, const std::string& where) {
+    if (body.size() > 0xffff) {
+        throw DescriptionError(where + ": a page has at most 65535 bytes");
+    }
     return Bytes{type, byteOf(page), byteOf(body.size() >> 8U), byteOf(body.size())} + body;
 }
 
@@ -110,6 +120,8 @@ Bytes designatorOf(const toml::table& table, const std::string& where) {
     keys.require("type");
     const std::uint64_t type = keys.number("type", 15).value_or(0);
     const std::uint64_t association = keys.number("association", 3).value_or(0);
+    const std::uint64_t protocolValid = keys.boolean("piv").value_or(false) ? 1 : 0;
+    const std::uint64_t protocol = keys.number("protocol", 15).value_or(0);
     const auto text = keys.string("text");
     const auto hex = keys.hex("hex");
     if (text.has_value() == hex.has_value()) {
@@ -121,22 +133,34 @@ Bytes designatorOf(const toml::table& table, const std::string& where) {
     if (identifier.size() > 0xff) {
         refuse(table, where, "a designator has at most 255 bytes");
     }
-    return Bytes{byteOf(codeSet), byteOf(association << 4U | type), 0, byteOf(identifier.size())} +
+    return Bytes{byteOf(protocol << 4U | codeSet), byteOf(protocolValid << 7U | association << 4U | type), 0,
+                 byteOf(identifier.size())} +
            identifier;
 }
 
 void addRawAnswers(Keys& keys, Disk& disk) {
-    const toml::node* raw = keys.find("raw");
+    const toml::table* raw = keys.table("raw");
     if (raw == nullptr) {
         return;
     }
     const std::string where = keys.where() + ".raw";
-    if (!raw->is_table()) {
-        refuse(*raw, where, "must be a table");
+    for (auto&& [key, value] : *raw) {
+        const std::string command(key.str());
+        disk.answers[commandOf(command, value, where)] =
+            bytesOfHex(stringOf(value, where + "." + command), where);
     }
-    for (auto&& [key, value] : *raw->as_table()) {
-        disk.answers[commandOf(key.str(), value, where)] =
-            bytesOfHex(value.value_or(std::string_view("not a string")), where);
+}
+
+// Page 0x00, the list of the pages that the disk answers; a disk without pages has no such list.
+void addPageList(char type, Disk& disk, const std::string& where) {
+    Bytes pages{0};
+    for (const auto& [command, answer] : disk.answers) {
+        if (command > 0) {
+            pages += byteOf(static_cast<std::uint64_t>(command));
+        }
+    }
+    if (pages.size() > 1) {
+        disk.answers.try_emplace(0, pageOf(type, 0, pages, where));
     }
 }
 
@@ -147,14 +171,14 @@ std::vector<std::string> nodesOf(Keys& keys) {
         nodes.push_back(node.as_string()->get());
     } else if (node.is_array()) {
         for (const auto& element : *node.as_array()) {
-            nodes.push_back(element.value_or(std::string()));
+            nodes.push_back(stringOf(element, keys.where() + ".node"));
         }
     }
     if (nodes.empty()) {
         refuse(node, keys.where() + ".node", "must be a path or a list of paths");
     }
     for (const auto& path : nodes) {
-        if (path.rfind("/dev/", 0) != 0 || path.size() == 5) {
+        if (path.rfind("/dev/", 0) != 0 || !isPlain(path)) {
             refuse(node, keys.where() + ".node", "must stand under /dev: \"" + path + "\"");
         }
     }
@@ -179,27 +203,20 @@ Disk diskOf(const toml::table& table, const std::string& where) {
     const char type = byteOf(keys.number("type", 0xff).value_or(0));
     disk.answers[standardInquiry] = standardData(keys, type);
     if (const auto serial = keys.bytes("serial")) {
-        disk.answers[0x80] = pageOf(type, 0x80, *serial);
+        disk.answers[0x80] = pageOf(type, 0x80, *serial, where);
     }
-    if (const toml::array* designators = keys.array("designators")) {
+    if (keys.find("designators") != nullptr) {
         Bytes list;
-        for (const auto& designator : *designators) {
-            if (!designator.is_table()) {
-                refuse(designator, where + ".designators", "must hold tables");
-            }
-            list += designatorOf(*designator.as_table(), where + ".designators");
+        for (const auto& designator : keys.array("designators")) {
+            list += designatorOf(tableOf(designator, where + ".designators"), where + ".designators");
         }
-        disk.answers[0x83] = pageOf(type, 0x83, list);
+        disk.answers[0x83] = pageOf(type, 0x83, list, where);
     }
     addRawAnswers(keys, disk);
+    addPageList(type, disk, where);
     disk.ignoresAllocationLength = keys.boolean("ignores_allocation_length").value_or(false);
-    if (const toml::array* faults = keys.array("faults")) {
-        for (const auto& fault : *faults) {
-            if (!fault.is_table()) {
-                refuse(fault, where + ".faults", "must hold tables");
-            }
-            disk.faults.push_back(faultOf(*fault.as_table(), where + ".faults"));
-        }
+    for (const auto& fault : keys.array("faults")) {
+        disk.faults.push_back(faultOf(tableOf(fault, where + ".faults"), where + ".faults"));
     }
     keys.refuseUnknown();
     return disk;

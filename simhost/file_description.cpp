@@ -9,6 +9,13 @@ std::string lastComponent(const std::string& path) {
     return path.substr(path.rfind('/') + 1);
 }
 
+// A name leads nowhere else.
+void refuseUnlessEntryName(const std::string& name, const toml::node& node, const std::string& where) {
+    if (name.empty() || name == "." || name == ".." || name.find('/') != std::string::npos) {
+        refuse(node, where, "no name of an entry: \"" + name + "\"");
+    }
+}
+
 BlockEntry blockEntry(const toml::table& table, const std::string& where) {
     Keys keys(table, where);
     BlockEntry entry;
@@ -37,9 +44,10 @@ BlockEntry blockEntry(const toml::table& table, const std::string& where) {
     }
     const auto name = keys.string("name");
     entry.name = name ? *name : lastComponent(entry.target);
-    if (entry.name.empty() || (!name && !link)) {
+    if (!name && !link) {
         refuse(table, where, "has no \"name\"");
     }
+    refuseUnlessEntryName(entry.name, table, where);
     keys.refuseUnknown();
     return entry;
 }
@@ -58,16 +66,16 @@ Bytes partitionsText(const std::vector<std::string>& names) {
 
 std::vector<std::string> partitionNames(Keys& keys) {
     std::vector<std::string> names;
-    const toml::array* list = keys.array("partitions");
-    for (std::size_t i = 0; list != nullptr && i < list->size(); ++i) {
+    const toml::array& list = keys.array("partitions");
+    for (std::size_t i = 0; i < list.size(); ++i) {
         const std::string where = "partitions " + std::to_string(i);
-        const toml::node& entry = *list->get(i);
+        const toml::node& entry = list[i];
         if (entry.is_string()) {
             names.push_back(entry.as_string()->get());
         } else if (entry.is_table()) {
             for (const auto& copy : unrolled(*entry.as_table(), where)) {
                 Keys copyKeys(copy, where);
-                names.push_back(copyKeys.require("name").value_or(std::string()));
+                names.push_back(stringOf(copyKeys.require("name"), where + ".name"));
                 copyKeys.refuseUnknown();
             }
         } else {
@@ -85,9 +93,9 @@ File fileOf(const toml::node& node, const std::string& path) {
     Keys keys(*table, path);
     const auto error = keys.string("error");
     const auto link = keys.string("link");
-    const auto missing = keys.boolean("missing");
+    const bool missing = keys.flag("missing");
     keys.refuseUnknown();
-    if (int{error.has_value()} + int{link.has_value()} + int{missing.has_value()} != 1) {
+    if (int{error.has_value()} + int{link.has_value()} + int{missing} != 1) {
         refuse(node, path, R"(needs one of "hex", "error", "link" and "missing")");
     }
     if (link) {
@@ -119,9 +127,9 @@ CommandAnswer commandAnswer(const toml::node& node, const std::string& where) {
 constexpr const char* pgrepPath = "/usr/bin/pgrep";
 constexpr int pgrepFoundNothing = 1; // its exit status
 
-bool isMissing(const toml::node& node) {
+bool isMissing(const toml::node& node, const std::string& where) {
     const auto* table = node.as_table();
-    return table != nullptr && table->size() == 1 && (*table)["missing"].value_or(false);
+    return table != nullptr && table->size() == 1 && Keys(*table, where).flag("missing");
 }
 
 } // namespace
@@ -132,12 +140,13 @@ std::optional<std::vector<BlockEntry>> sysBlockOf(Keys& host) {
         return std::nullopt;
     }
     std::vector<BlockEntry> entries;
-    const toml::array* list = host.array("sys_block");
-    for (std::size_t i = 0; list != nullptr && i < list->size(); ++i) {
+    const toml::array& list = host.array("sys_block");
+    for (std::size_t i = 0; i < list.size(); ++i) {
         const std::string where = "sys_block " + std::to_string(i);
-        const toml::node& entry = *list->get(i);
+        const toml::node& entry = list[i];
         if (entry.is_string()) {
             const std::string target = entry.as_string()->get();
+            refuseUnlessEntryName(lastComponent(target), entry, where);
             entries.push_back({lastComponent(target), BlockEntry::Kind::Link, target});
         } else if (entry.is_table()) {
             for (const auto& copy : unrolled(*entry.as_table(), where)) {
@@ -154,15 +163,15 @@ std::map<std::string, File> filesOf(Keys& host) {
     std::map<std::string, File> result;
     const bool described = host.find("partitions") != nullptr;
     result["/proc/partitions"] = {File::Kind::Content, partitionsText(partitionNames(host))};
-    const toml::node* node = host.find("files");
-    if (node == nullptr) {
+    const toml::table* table = host.table("files");
+    if (table == nullptr) {
         return result;
     }
-    if (!node->is_table()) {
-        refuse(*node, "files", "must be a table");
-    }
-    for (auto&& [key, value] : *node->as_table()) {
+    for (auto&& [key, value] : *table) {
         const std::string path(key.str());
+        if (!isPlain(path)) {
+            refuse(value, path, R"(a path has no empty, "." or ".." part)");
+        }
         const bool inEtc = path.rfind("/etc/", 0) == 0;
         const bool inRoot = path.size() > 1 && path[0] == '/' && path.find('/', 1) == std::string::npos;
         if (!inEtc && !inRoot && path != "/proc/partitions") {
@@ -184,21 +193,18 @@ std::map<std::string, File> filesOf(Keys& host) {
 std::map<std::string, std::vector<CommandAnswer>> commandsOf(Keys& host) {
     std::map<std::string, std::vector<CommandAnswer>> result;
     result[pgrepPath] = {{{}, {}, pgrepFoundNothing}}; // part of every system
-    const toml::node* node = host.find("commands");
-    if (node == nullptr) {
+    const toml::table* table = host.table("commands");
+    if (table == nullptr) {
         return result;
     }
-    if (!node->is_table()) {
-        refuse(*node, "commands", "must be a table");
-    }
-    for (auto&& [key, value] : *node->as_table()) {
+    for (auto&& [key, value] : *table) {
         const std::string path(key.str());
         if (std::find(commandPaths.begin(), commandPaths.end(), path) == commandPaths.end()) {
             refuse(value, path, "commands are /sbin/iscsiadm, /usr/bin/pgrep and /sbin/powermt");
         }
         auto& answers = result[path];
         answers.clear();
-        if (path == pgrepPath && isMissing(value)) {
+        if (path == pgrepPath && isMissing(value, path)) {
             result.erase(path);
             continue;
         }

@@ -16,6 +16,8 @@ int hexDigit(char c) {
     return lower >= 'a' && lower <= 'f' ? lower - 'a' + 10 : -1;
 }
 
+constexpr unsigned longestNumber = 20; // digits of a 64-bit number
+
 // The number as a placeholder "{n}", "{n:04}" or "{n:08x}" writes it; `format` is what follows "n".
 std::string numberAs(std::uint64_t number, std::string_view format, const std::string& where) {
     if (format.empty()) {
@@ -29,6 +31,10 @@ std::string numberAs(std::uint64_t number, std::string_view format, const std::s
         (!kind.empty() && kind != "x")) {
         throw DescriptionError(where + ": a placeholder is {n}, {n:04} or {n:08x}, not {n" +
                                std::string(format) + "}");
+    }
+    if (width > longestNumber) {
+        throw DescriptionError(where + ": a placeholder has at most " + std::to_string(longestNumber) +
+                               " digits");
     }
     std::ostringstream text;
     text << std::setfill('0') << std::setw(static_cast<int>(width)) << (kind.empty() ? std::dec : std::hex)
@@ -96,6 +102,35 @@ void refuse(const toml::node& node, const std::string& where, const std::string&
     throw DescriptionError((line == 0 ? "" : "line " + std::to_string(line) + ": ") + where + ": " + what);
 }
 
+std::string stringOf(const toml::node& node, const std::string& where) {
+    if (!node.is_string()) {
+        refuse(node, where, "must be a string");
+    }
+    return node.as_string()->get();
+}
+
+bool booleanOf(const toml::node& node, const std::string& where) {
+    if (!node.is_boolean()) {
+        refuse(node, where, "must be true or false");
+    }
+    return node.as_boolean()->get();
+}
+
+const toml::table& tableOf(const toml::node& node, const std::string& where) {
+    if (!node.is_table()) {
+        refuse(node, where, "must be a table");
+    }
+    return *node.as_table();
+}
+
+std::uint64_t numberOf(const toml::node& node, const std::string& where, std::uint64_t most) {
+    const auto* value = node.as_integer();
+    if (value == nullptr || value->get() < 0 || static_cast<std::uint64_t>(value->get()) > most) {
+        refuse(node, where, "must be a number from 0 to " + std::to_string(most));
+    }
+    return static_cast<std::uint64_t>(value->get());
+}
+
 Bytes bytesOf(const toml::node& node, const std::string& where) {
     if (const auto* text = node.as_string()) {
         return text->get();
@@ -111,6 +146,11 @@ Bytes bytesOf(const toml::node& node, const std::string& where) {
         refuse(node, where, "must be a string or { hex = \"…\" }");
     }
     return *bytes;
+}
+
+bool isPlain(const std::string& path) {
+    return (path + "/").find("//") == std::string::npos && (path + "/").find("/./") == std::string::npos &&
+           (path + "/").find("/../") == std::string::npos;
 }
 
 std::vector<toml::table> unrolled(const toml::table& entry, const std::string& where) {
@@ -145,81 +185,70 @@ const toml::node& Keys::require(std::string_view key) {
     return *node;
 }
 
+std::string Keys::whereIs(std::string_view key) const {
+    return mWhere + "." + std::string(key);
+}
+
 std::optional<std::string> Keys::string(std::string_view key) {
     const toml::node* node = find(key);
-    if (node == nullptr) {
-        return std::nullopt;
-    }
-    if (!node->is_string()) {
-        refuse(*node, mWhere + "." + std::string(key), "must be a string");
-    }
-    return node->as_string()->get();
+    return node == nullptr ? std::nullopt : std::optional(stringOf(*node, whereIs(key)));
 }
 
 std::optional<bool> Keys::boolean(std::string_view key) {
     const toml::node* node = find(key);
-    if (node == nullptr) {
-        return std::nullopt;
+    return node == nullptr ? std::nullopt : std::optional(booleanOf(*node, whereIs(key)));
+}
+
+bool Keys::flag(std::string_view key) {
+    const auto value = boolean(key);
+    if (value && !*value) {
+        refuse(*find(key), whereIs(key), "can only be true");
     }
-    if (!node->is_boolean()) {
-        refuse(*node, mWhere + "." + std::string(key), "must be true or false");
-    }
-    return node->as_boolean()->get();
+    return value.has_value();
 }
 
 std::optional<Bytes> Keys::bytes(std::string_view key) {
     const toml::node* node = find(key);
-    if (node == nullptr) {
-        return std::nullopt;
-    }
-    return bytesOf(*node, mWhere + "." + std::string(key));
+    return node == nullptr ? std::nullopt : std::optional(bytesOf(*node, whereIs(key)));
 }
 
 std::optional<Bytes> Keys::hex(std::string_view key) {
     const auto text = string(key);
-    if (!text) {
-        return std::nullopt;
-    }
-    return bytesOfHex(*text, mWhere + "." + std::string(key));
+    return text ? std::optional(bytesOfHex(*text, whereIs(key))) : std::nullopt;
 }
 
 std::optional<std::uint64_t> Keys::number(std::string_view key, std::uint64_t most) {
     const toml::node* node = find(key);
-    if (node == nullptr) {
-        return std::nullopt;
-    }
-    const auto* value = node->as_integer();
-    if (value == nullptr || value->get() < 0 || static_cast<std::uint64_t>(value->get()) > most) {
-        refuse(*node, mWhere + "." + std::string(key), "must be a number from 0 to " + std::to_string(most));
-    }
-    return static_cast<std::uint64_t>(value->get());
+    return node == nullptr ? std::nullopt : std::optional(numberOf(*node, whereIs(key), most));
 }
 
 std::uint32_t Keys::number32(std::string_view key, std::uint32_t absent) {
     return static_cast<std::uint32_t>(number(key).value_or(absent));
 }
 
-const toml::array* Keys::array(std::string_view key) {
+const toml::array& Keys::array(std::string_view key) {
+    static const toml::array kNone;
     const toml::node* node = find(key);
-    if (node != nullptr && !node->is_array()) {
-        refuse(*node, mWhere + "." + std::string(key), "must be a list");
+    if (node == nullptr) {
+        return kNone;
     }
-    return node == nullptr ? nullptr : node->as_array();
+    if (!node->is_array()) {
+        refuse(*node, whereIs(key), "must be a list");
+    }
+    return *node->as_array();
+}
+
+const toml::table* Keys::table(std::string_view key) {
+    const toml::node* node = find(key);
+    return node == nullptr ? nullptr : &tableOf(*node, whereIs(key));
 }
 
 std::vector<toml::table> Keys::tables(std::string_view key) {
     std::vector<toml::table> result;
-    const toml::array* entries = array(key);
-    if (entries == nullptr) {
-        return result;
-    }
-    for (std::size_t i = 0; i < entries->size(); ++i) {
+    const toml::array& entries = array(key);
+    for (std::size_t i = 0; i < entries.size(); ++i) {
         const std::string where = std::string(key) + " " + std::to_string(i);
-        const toml::node& entry = *entries->get(i);
-        if (!entry.is_table()) {
-            refuse(entry, where, "must be a table");
-        }
-        for (auto& copy : unrolled(*entry.as_table(), where)) {
+        for (auto& copy : unrolled(tableOf(entries[i], where), where)) {
             result.push_back(std::move(copy));
         }
     }

@@ -47,6 +47,7 @@ private:
 };
 
 const std::string standardInquiry = "120000002400";
+const std::string page00 = "12010000ff00";
 const std::string page80 = "128080000400";
 const std::string page83 = "12018300ff00";
 
@@ -90,6 +91,42 @@ TEST_P(Disks, answerStandardDataAndPages) {
               "/dev/sda: status 0 host 0 driver 0 resid 40 sense 0: data "
               "0c830014010300085000c5001a2b3c4d031800046e616d65\n"
               "/dev/sda: status 0 host 0 driver 0 resid 60 sense 0: data 0c830014\n");
+}
+
+TEST_P(Disks, putProtocolAndItsValidityIntoADesignator) {
+    const SimHost host(R"(
+        [[disk]]
+        node = "/dev/sda"
+        designators = [
+            { type = 4, hex = "00000001", association = 1, piv = true, protocol = 6 },
+            { type = 8, text = "n", association = 2, protocol = 15 },
+            { type = 3, hex = "50", piv = true },
+        ]
+    )");
+    EXPECT_EQ(ask(host, {"/dev/sda", page83}), "/dev/sda: status 0 host 0 driver 0 resid 42 sense 0: data "
+                                               "008300126194000400000001f22800016e0183000150\n");
+}
+
+TEST_P(Disks, listThePagesThatTheyAnswer) {
+    const SimHost host(R"(
+        [[disk]]
+        node = "/dev/sda"
+        type = 0x0c
+        serial = "S"
+        designators = []
+        raw = { 0xb1 = "0cb10000", 0x01 = "0c010000" }
+        [[disk]]
+        node = "/dev/sdb"
+        serial = "S"
+        raw = { 0x00 = "00000001ff" }
+        [[disk]]
+        node = "/dev/sdc"
+    )");
+    EXPECT_EQ(
+        ask(host, {"/dev/sda", page00, "/dev/sdb", page00, "/dev/sdc", page00}),
+        "/dev/sda: status 0 host 0 driver 0 resid 55 sense 0: data 0c00000500018083b1\n"
+        "/dev/sdb: status 0 host 0 driver 0 resid 59 sense 0: data 00000001ff\n"
+        "/dev/sdc: status 2 host 0 driver 8 resid 64 sense 18:700005000000000a00000000240000000000 data \n");
 }
 
 TEST_P(Disks, refuseWhatIsNotDescribedAsDevicesDo) {
@@ -402,9 +439,9 @@ TEST(SimHostLeavesTheRealMachine, withoutTheProgramsProcesses) {
 
 TEST(SimHostProgram, keepsItsDirectoryArgumentsAndStatus) {
     const SimHost host("");
-    const ProcessResult result =
-        host.run({"/bin/sh", "-c", "pwd; echo $1; echo e >&2; echo f >file; exit 42", "sh", "--"});
-    EXPECT_EQ(result.output, host.work().string() + "\n--\n");
+    const ProcessResult result = host.run(
+        {"/bin/sh", "-c", "pwd; echo $*; echo e >&2; echo f >file; exit 42", "sh", "--", "[a,b]", "--keep"});
+    EXPECT_EQ(result.output, host.work().string() + "\n-- [a,b] --keep\n");
     EXPECT_EQ(result.error, "e\n");
     EXPECT_EQ(result.status, 42);
     EXPECT_EQ(contentOf(host.work() / "file"), "f\n");
@@ -454,6 +491,65 @@ TEST(SimHostDescription, isRefusedWhereItIsWrong) {
     EXPECT_EQ(complaint("[[adapter]]\nwwnn = '00'\n"), "host.toml: adapter 0.wwnn: a WWN has 8 bytes\n");
     EXPECT_EQ(complaint("[[adapter]]\nname = '" + std::string(256, 'x') + "'\n"),
               "host.toml: adapter 0: a name has at most 255 bytes\n");
+}
+
+TEST(SimHostDescription, isRefusedWhereAValueHasAnotherType) {
+    EXPECT_EQ(complaint("partitions = [{ name = 5 }]\n"), "host.toml: partitions 0.name: must be a string\n");
+    EXPECT_EQ(complaint("[files]\n'/etc/x' = { missing = false }\n"),
+              "host.toml: line 2: /etc/x.missing: can only be true\n");
+    EXPECT_EQ(complaint("[files]\n'/etc/x' = { missing = 1 }\n"),
+              "host.toml: line 2: /etc/x.missing: must be true or false\n");
+    EXPECT_EQ(complaint("[commands]\n'/usr/bin/pgrep' = { missing = 1 }\n"),
+              "host.toml: line 2: /usr/bin/pgrep.missing: must be true or false\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = ['/dev/x', 5]\n"), "host.toml: disk 0.node: must be a string\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = 5\n"),
+              "host.toml: disk 0.node: must be a path or a list of paths\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nraw = { 0x83 = 83 }\n"),
+              "host.toml: disk 0.raw.0x83: must be a string\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nfaults = [{ command = 0x83 }]\n"),
+              "host.toml: disk 0.faults.command: must be a string\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nfaults = [{ resid = 1.0 }]\n"),
+              "host.toml: disk 0.faults.resid: must be a 32-bit number\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\ndesignators = [{ type = 3, hex = '', piv = 1 }]\n"),
+              "host.toml: disk 0.designators.piv: must be true or false\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\ndesignators = [{ type = 3, hex = '', protocol = 16 }]\n"),
+              "host.toml: disk 0.designators.protocol: must be a number from 0 to 15\n");
+    EXPECT_EQ(complaint("[[adapter]]\nports = [5]\n"), "host.toml: adapter 0.ports: must be a string\n");
+    EXPECT_EQ(complaint("[[adapter]]\nport_status = ['x']\n"),
+              "host.toml: adapter 0.port_status: must be a number from 0 to 4294967295\n");
+    EXPECT_EQ(complaint("[[adapter]]\nport_status = [-1]\n"),
+              "host.toml: adapter 0.port_status: must be a number from 0 to 4294967295\n");
+    EXPECT_EQ(complaint("[[adapter]]\nmapping = [7]\n"), "host.toml: adapter 0.mapping: must be a table\n");
+}
+
+TEST(SimHostDescription, isRefusedWhereAValueDoesNotFitItsField) {
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nfaults = [{ nth = 0 }]\n"),
+              "host.toml: disk 0.faults: commands count from 1\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nfaults = [{ from = 0 }]\n"),
+              "host.toml: disk 0.faults: commands count from 1\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nfaults = [{ delay_ms = 2147483648 }]\n"),
+              "host.toml: disk 0.faults.delay_ms: must be a number from 0 to 2147483647\n");
+    const std::string tail(2 * 225, '0');
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\ntail = '" + tail + "'\n"),
+              "host.toml: disk 0: a tail of more than 224 bytes needs \"additional_length\"\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nserial = '" + std::string(65536, 'x') + "'\n"),
+              "host.toml: disk 0: a page has at most 65535 bytes\n");
+    EXPECT_EQ(complaint("partitions = [{ name = 'sd{n:099}', count = 1 }]\n"),
+              "host.toml: partitions 0: a placeholder has at most 20 digits\n");
+}
+
+// The directories around the described ones are the real machine's.
+TEST(SimHostDescription, isRefusedWhereAPathLeavesItsPlace) {
+    EXPECT_EQ(complaint("[files]\n'/etc/../tmp/morvane-test' = ''\n"),
+              "host.toml: line 2: /etc/../tmp/morvane-test: a path has no empty, \".\" or \"..\" part\n");
+    EXPECT_EQ(complaint("[files]\n'/..' = ''\n"),
+              "host.toml: line 2: /..: a path has no empty, \".\" or \"..\" part\n");
+    EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/../tmp/morvane-test'\n"),
+              "host.toml: disk 0.node: must stand under /dev: \"/dev/../tmp/morvane-test\"\n");
+    EXPECT_EQ(complaint("sys_block = [{ name = '../x', type = 'file' }]\n"),
+              "host.toml: sys_block 0: no name of an entry: \"../x\"\n");
+    EXPECT_EQ(complaint("sys_block = ['..']\n"),
+              "host.toml: line 1: sys_block 0: no name of an entry: \"..\"\n");
 }
 
 } // namespace
