@@ -1,4 +1,3 @@
-// simhost HOST.toml [--record FILE] [--keep DIR] -- PROGRAM [ARGUMENT...]
 // Runs a program on a simulated host; README.md says how.
 #include <fcntl.h>
 #include <sched.h>
@@ -6,15 +5,17 @@
 #include <sys/syscall.h>
 #include <sys/wait.h>
 
+#include <algorithm>
 #include <chrono>
 #include <csignal>
 #include <cstring>
 #include <filesystem>
 #include <iostream>
-#include <optional>
 #include <string>
 #include <string_view>
 #include <thread>
+
+#include <CLI/CLI.hpp>
 
 #include "simhost/description.hpp"
 #include "simhost/file_descriptor.hpp"
@@ -30,8 +31,7 @@ namespace fs = std::filesystem;
 constexpr int cannotSetUp = 125;
 constexpr int cannotRun = 127;
 
-constexpr std::string_view usage =
-    "usage: simhost HOST.toml [--record FILE] [--keep DIR] -- PROGRAM [ARGUMENT...]\n";
+constexpr int kWrongUsage = 2;
 
 struct Arguments {
     fs::path description;
@@ -40,25 +40,30 @@ struct Arguments {
     char** program = nullptr;
 };
 
-std::optional<Arguments> readArguments(int count, char** values) {
-    Arguments arguments;
-    for (int i = 1; i < count; ++i) {
-        const std::string_view value = values[i];
-        if (value == "--" && i + 1 < count && !arguments.description.empty()) {
-            arguments.program = values + i + 1;
-            return arguments;
+// Reads the command line up to "--"; what follows is the program's and goes to it as it is. Returns the
+// status to end with when there is nothing to run: help was asked for, or the line makes no sense and
+// standard error says why.
+int readArguments(int count, char** values, Arguments& arguments) {
+    char** end = values + count;
+    char** own = std::find(values, end, std::string_view("--"));
+    CLI::App app{"Runs a program on a simulated host.", "simhost"};
+    app.footer("The program and its arguments follow behind --:\n"
+               "  simhost HOST.toml [OPTIONS] -- PROGRAM [ARGUMENT...]");
+    app.add_option("HOST", arguments.description, "the description of the host, TOML")->required();
+    app.add_option("--record", arguments.record, "write what the program asks of the host to FILE")
+        ->type_name("FILE");
+    app.add_option("--keep", arguments.keep, "copy the files that are made for the host into DIR")
+        ->type_name("DIR");
+    try {
+        app.parse(static_cast<int>(own - values), values);
+        if (end - own < 2) {
+            throw CLI::RequiredError("-- PROGRAM");
         }
-        if (value == "--record" && i + 1 < count) {
-            arguments.record = values[++i];
-        } else if (value == "--keep" && i + 1 < count) {
-            arguments.keep = values[++i];
-        } else if (arguments.description.empty() && value.substr(0, 1) != "-") {
-            arguments.description = value;
-        } else {
-            return std::nullopt;
-        }
+    } catch (const CLI::ParseError& error) {
+        return app.exit(error) == 0 ? 0 : kWrongUsage;
     }
-    return std::nullopt;
+    arguments.program = own + 1;
+    return 0;
 }
 
 // The status that a shell gives for a process that ended like this.
@@ -165,13 +170,13 @@ int run(const Host& host, Arguments arguments) {
 } // namespace simhost
 
 int main(int argumentCount, char** argumentValues) {
-    const auto arguments = simhost::readArguments(argumentCount, argumentValues);
-    if (!arguments) {
-        std::cerr << simhost::usage;
-        return 2;
-    }
     try {
-        return simhost::run(simhost::readDescription(arguments->description), *arguments);
+        simhost::Arguments arguments;
+        const int status = simhost::readArguments(argumentCount, argumentValues, arguments);
+        if (arguments.program == nullptr) {
+            return status;
+        }
+        return simhost::run(simhost::readDescription(arguments.description), arguments);
     } catch (const std::exception& error) {
         std::cerr << "simhost: " << error.what() << '\n';
         return simhost::cannotSetUp;

@@ -552,5 +552,49 @@ TEST(SimHostDescription, isRefusedWhereAPathLeavesItsPlace) {
               "host.toml: line 1: sys_block 0: no name of an entry: \"..\"\n");
 }
 
+// ---- The command line ----
+
+TEST(SimHostProgram, saysHowItIsCalled) {
+    const ProcessResult help = runProcess({SIMHOST_PROGRAM, "--help"}, "/");
+    EXPECT_EQ(help.output, R"(Runs a program on a simulated host.
+Usage: simhost [OPTIONS] HOST
+
+Positionals:
+  HOST TEXT REQUIRED          the description of the host, TOML
+
+Options:
+  -h,--help                   Print this help message and exit
+  --record FILE               write what the program asks of the host to FILE
+  --keep DIR                  copy the files that are made for the host into DIR
+
+The program and its arguments follow behind --:
+  simhost HOST.toml [OPTIONS] -- PROGRAM [ARGUMENT...]
+)");
+    EXPECT_EQ(help.error, "");
+    EXPECT_EQ(help.status, 0);
+}
+
+TEST(SimHostProgram, refusesACommandLineThatItDoesNotUnderstand) {
+    const auto refusal = [](const std::vector<std::string>& arguments) {
+        std::vector<std::string> command = {SIMHOST_PROGRAM};
+        command.insert(command.end(), arguments.begin(), arguments.end());
+        const ProcessResult result = runProcess(command, "/");
+        EXPECT_EQ(result.output, "");
+        EXPECT_EQ(result.status, 2);
+        const std::string hint = "Run with --help for more information.\n";
+        EXPECT_TRUE(result.error.ends_with(hint)) << result.error;
+        return result.error.substr(0, result.error.size() - std::min(result.error.size(), hint.size()));
+    };
+    EXPECT_EQ(refusal({}), "HOST is required\n");
+    EXPECT_EQ(refusal({"--", "/bin/true"}), "HOST is required\n");
+    EXPECT_EQ(refusal({"host.toml"}), "-- PROGRAM is required\n");
+    EXPECT_EQ(refusal({"host.toml", "--"}), "-- PROGRAM is required\n");
+    EXPECT_EQ(refusal({"host.toml", "--record", "--", "/bin/true"}), "--record: 1 required FILE missing\n");
+    EXPECT_EQ(refusal({"host.toml", "--recrod=x", "--", "/bin/true"}),
+              "The following argument was not expected: --recrod=x\n");
+    EXPECT_EQ(refusal({"host.toml", "other.toml", "--", "/bin/true"}),
+              "The following argument was not expected: other.toml\n");
+}
+
 } // namespace
 } // namespace test
