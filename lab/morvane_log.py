@@ -12,7 +12,7 @@ BANNERS = {
     "LOGICAL": "============ LOGICAL DEVICE DETAILS ============",
     "END": "\t\t\t   END ",
 }
-TRACE = re.compile(r"(?:Entered|Left) Function \S+ Line \d+\n")
+TRACE = re.compile(r"(?:Entered|Left) Function .+? Line \d+\n")  # a conversion operator's name has blanks
 WWN = r"[0-9a-f]{2}(?::[0-9a-f]{2}){7}"
 
 
