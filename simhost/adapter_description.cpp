@@ -6,7 +6,7 @@
 namespace simhost {
 namespace {
 
-constexpr std::size_t longestAdapterName = 255; // libHBAAPI needs the NUL
+constexpr std::size_t kLongestAdapterName = 255; // libHBAAPI needs the NUL
 
 Wwn wwnOf(std::string text, const toml::node& node, const std::string& where) {
     std::replace(text.begin(), text.end(), ':', ' ');
@@ -82,7 +82,7 @@ Adapter adapterOf(const toml::table& table, std::size_t index) {
     Keys keys(table, where);
     Adapter adapter;
     adapter.name = keys.bytes("name").value_or("simhba-" + std::to_string(index));
-    if (adapter.name.size() > longestAdapterName) {
+    if (adapter.name.size() > kLongestAdapterName) {
         refuse(table, where, "a name has at most 255 bytes");
     }
     adapter.manufacturer = keys.bytes("manufacturer").value_or("");

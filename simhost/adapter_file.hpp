@@ -7,7 +7,7 @@
 
 namespace simhost {
 
-inline constexpr const char* adapterFilePath = "/.simhost/adapters";
+inline constexpr const char* kAdapterFilePath = "/.simhost/adapters";
 
 struct AdapterFileHeader {
     std::uint32_t registerStatus;

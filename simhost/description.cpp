@@ -19,7 +19,7 @@ Host hostOf(const toml::table& document) {
     host.vendorLibrary = vendorLibraryOf(keys, host.adapters.size());
     if (host.vendorLibrary) {
         host.files.try_emplace("/etc/hba.conf", File{File::Kind::Content, std::string("org.simhost.hba ") +
-                                                                              vendorLibraryName + "\n"});
+                                                                              kVendorLibraryName + "\n"});
     }
     keys.refuseUnknown();
     return host;

@@ -46,8 +46,8 @@ struct CommandAnswer {
 };
 
 // The command that a disk was sent, as faults and answers tell commands apart: a VPD page by its number.
-constexpr int standardInquiry = -1;
-constexpr int otherCommand = -2; // not INQUIRY, or an INQUIRY that no device accepts
+constexpr int kStandardInquiry = -1;
+constexpr int kOtherCommand = -2; // not INQUIRY, or an INQUIRY that no device accepts
 
 // A deviation from what a disk would answer.
 struct Fault {
@@ -129,12 +129,12 @@ struct Host {
 };
 
 // The commands that a description may answer.
-inline constexpr std::array<const char*, 3> commandPaths = {"/sbin/iscsiadm", "/usr/bin/pgrep",
-                                                            "/sbin/powermt"};
+inline constexpr std::array<const char*, 3> kCommandPaths = {"/sbin/iscsiadm", "/usr/bin/pgrep",
+                                                             "/sbin/powermt"};
 
 // The vendor library as /etc/hba.conf names it. The loader of each word size puts its own folder for $LIB, so
 // that one line serves both word sizes and a message that shows the path is the same in both.
-inline constexpr const char* vendorLibraryName = "/.simhost/$LIB/libsimhba.so";
+inline constexpr const char* kVendorLibraryName = "/.simhost/$LIB/libsimhba.so";
 
 // Reads a description; throws DescriptionError.
 Host readDescription(const std::filesystem::path& path);

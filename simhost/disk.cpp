@@ -5,32 +5,32 @@
 namespace simhost {
 namespace {
 
-constexpr std::uint8_t checkCondition = 0x02;
-constexpr std::uint16_t driverSense = 0x08;
+constexpr std::uint8_t kCheckCondition = 0x02;
+constexpr std::uint16_t kDriverSense = 0x08;
 
 // Fixed-format sense: ILLEGAL REQUEST with this additional sense code, qualifier 0.
 Bytes illegalRequest(char additionalSenseCode) {
     return {0x70, 0, 5, 0, 0, 0, 0, 10, 0, 0, 0, 0, additionalSenseCode, 0, 0, 0, 0, 0};
 }
-constexpr char invalidOperationCode = 0x20;
-constexpr char invalidFieldInCdb = 0x24;
+constexpr char kInvalidOperationCode = 0x20;
+constexpr char kInvalidFieldInCdb = 0x24;
 
-constexpr std::uint8_t inquiry = 0x12;
+constexpr std::uint8_t kInquiry = 0x12;
 
 bool isInquiry(const ScsiRequest& request) {
-    return request.cdb.size() >= 6 && request.cdb[0] == inquiry;
+    return request.cdb.size() >= 6 && request.cdb[0] == kInquiry;
 }
 
 // The command as descriptions name it.
 int commandOf(const ScsiRequest& request) {
     if (!isInquiry(request)) {
-        return otherCommand;
+        return kOtherCommand;
     }
     const bool vitalProductData = (request.cdb[1] & 1U) != 0;
     if (vitalProductData) {
         return request.cdb[2];
     }
-    return request.cdb[2] == 0 ? standardInquiry : otherCommand; // a page code needs EVPD
+    return request.cdb[2] == 0 ? kStandardInquiry : kOtherCommand; // a page code needs EVPD
 }
 
 std::size_t allocationLength(const ScsiRequest& request) {
@@ -70,9 +70,9 @@ ScsiReply DiskNode::answer(const ScsiRequest& request) {
     } else if (const auto described = mDisk->answers.find(command); described != mDisk->answers.end()) {
         reply.data = described->second;
     } else if (fault == nullptr || !fault->data) {
-        reply.status = checkCondition;
-        reply.driverStatus = driverSense;
-        reply.sense = illegalRequest(isInquiry(request) ? invalidFieldInCdb : invalidOperationCode);
+        reply.status = kCheckCondition;
+        reply.driverStatus = kDriverSense;
+        reply.sense = illegalRequest(isInquiry(request) ? kInvalidFieldInCdb : kInvalidOperationCode);
     }
     if (fault != nullptr && fault->data) {
         reply.data = *fault->data;

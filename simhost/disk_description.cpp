@@ -8,7 +8,7 @@ namespace {
 
 int commandOf(std::string_view text, const toml::node& node, const std::string& where) {
     if (text == "standard") {
-        return standardInquiry;
+        return kStandardInquiry;
     }
     unsigned page = 0;
     if (text.size() > 2 && text.substr(0, 2) == "0x") {
@@ -145,9 +145,7 @@ void addRawAnswers(Keys& keys, Disk& disk) {
     }
     const std::string where = keys.where() + ".raw";
     for (auto&& [key, value] : *raw) {
-        const std::string command(key.str());
-        disk.answers[commandOf(command, value, where)] =
-            bytesOfHex(stringOf(value, where + "." + command), where);
+        disk.answers[commandOf(key.str(), value, where)] = bytesOfHex(stringOf(value, where), where);
     }
 }
 
@@ -201,7 +199,7 @@ Disk diskOf(const toml::table& table, const std::string& where) {
         }
     }
     const char type = byteOf(keys.number("type", 0xff).value_or(0));
-    disk.answers[standardInquiry] = standardData(keys, type);
+    disk.answers[kStandardInquiry] = standardData(keys, type);
     if (const auto serial = keys.bytes("serial")) {
         disk.answers[0x80] = pageOf(type, 0x80, *serial, where);
     }

@@ -124,8 +124,8 @@ CommandAnswer commandAnswer(const toml::node& node, const std::string& where) {
     return answer;
 }
 
-constexpr const char* pgrepPath = "/usr/bin/pgrep";
-constexpr int pgrepFoundNothing = 1; // its exit status
+constexpr const char* kPgrepPath = "/usr/bin/pgrep";
+constexpr int kPgrepFoundNothing = 1; // its exit status
 
 bool isMissing(const toml::node& node, const std::string& where) {
     const auto* table = node.as_table();
@@ -192,19 +192,19 @@ std::map<std::string, File> filesOf(Keys& host) {
 
 std::map<std::string, std::vector<CommandAnswer>> commandsOf(Keys& host) {
     std::map<std::string, std::vector<CommandAnswer>> result;
-    result[pgrepPath] = {{{}, {}, pgrepFoundNothing}}; // part of every system
+    result[kPgrepPath] = {{{}, {}, kPgrepFoundNothing}}; // part of every system
     const toml::table* table = host.table("commands");
     if (table == nullptr) {
         return result;
     }
     for (auto&& [key, value] : *table) {
         const std::string path(key.str());
-        if (std::find(commandPaths.begin(), commandPaths.end(), path) == commandPaths.end()) {
+        if (std::find(kCommandPaths.begin(), kCommandPaths.end(), path) == kCommandPaths.end()) {
             refuse(value, path, "commands are /sbin/iscsiadm, /usr/bin/pgrep and /sbin/powermt");
         }
         auto& answers = result[path];
         answers.clear();
-        if (path == pgrepPath && isMissing(value, path)) {
+        if (path == kPgrepPath && isMissing(value, path)) {
             result.erase(path);
             continue;
         }

@@ -28,8 +28,8 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr int cannotSetUp = 125;
-constexpr int cannotRun = 127;
+constexpr int kCannotSetUp = 125;
+constexpr int kCannotRun = 127;
 
 constexpr int kWrongUsage = 2;
 
@@ -103,7 +103,7 @@ int firstProcess(const Host& host, const Arguments& arguments, FileDescriptor re
         ::prctl(PR_SET_PDEATHSIG, 0);
         ::execvp(arguments.program[0], arguments.program);
         std::cerr << "simhost: " << arguments.program[0] << ": " << std::strerror(errno) << '\n';
-        ::_exit(cannotRun);
+        ::_exit(kCannotRun);
     }
     int status = 0;
     while (check(::waitpid(-1, &status, 0), "waiting for the program") != program) {
@@ -147,7 +147,7 @@ int run(const Host& host, Arguments arguments) {
             ::_exit(firstProcess(host, arguments, std::move(report.writing), proceed.reading));
         } catch (const std::exception& error) {
             std::cerr << "simhost: " << error.what() << '\n';
-            ::_exit(cannotSetUp);
+            ::_exit(kCannotSetUp);
         }
     }
     report.writing.reset();
@@ -179,6 +179,6 @@ int main(int argumentCount, char** argumentValues) {
         return simhost::run(simhost::readDescription(arguments.description), arguments);
     } catch (const std::exception& error) {
         std::cerr << "simhost: " << error.what() << '\n';
-        return simhost::cannotSetUp;
+        return simhost::kCannotSetUp;
     }
 }

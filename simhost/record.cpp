@@ -15,10 +15,10 @@ void Record::sgIo(const std::string& node, const SgRequest& request,
         return;
     }
     std::string line = "SG_IO " + node + " cdb=";
-    constexpr std::string_view digits = "0123456789abcdef";
+    constexpr std::string_view kDigits = "0123456789abcdef";
     for (const std::uint8_t byte : cdb) {
-        line += digits[byte >> 4U];
-        line += digits[byte & 0xfU];
+        line += kDigits[byte >> 4U];
+        line += kDigits[byte & 0xfU];
     }
     line += " dxfer_len=" + std::to_string(request.transferLength) +
             " dxfer_direction=" + std::to_string(request.direction) +

@@ -24,11 +24,11 @@
 namespace simhost {
 namespace {
 
-constexpr std::uint32_t ioctlNumber64 = 16; // on x86-64
-constexpr std::uint32_t ioctlNumber32 = 54; // on i386
+constexpr std::uint32_t kIoctlNumber64 = 16; // on x86-64
+constexpr std::uint32_t kIoctlNumber32 = 54; // on i386
 
-constexpr std::size_t longestCdb = 32; // the driver accepts no longer one
-constexpr std::uint32_t infoCheck = 1; // SG_INFO_CHECK: status, host status or driver status is not 0
+constexpr std::size_t kLongestCdb = 32; // the driver accepts no longer one
+constexpr std::uint32_t kInfoCheck = 1; // SG_INFO_CHECK: status, host status or driver status is not 0
 
 std::string procPath(pid_t process, const std::string& rest) {
     return "/proc/" + std::to_string(process) + rest;
@@ -50,7 +50,7 @@ bool deliver(pid_t process, const SgRequest& request, ScsiReply& reply) {
     outcome.driverStatus = reply.driverStatus;
     outcome.resid = reply.resid;
     outcome.duration = reply.delayMilliseconds;
-    outcome.info = reply.status != 0 || reply.hostStatus != 0 || reply.driverStatus != 0 ? infoCheck : 0;
+    outcome.info = reply.status != 0 || reply.hostStatus != 0 || reply.driverStatus != 0 ? kInfoCheck : 0;
 
     std::array<iovec, 3> local{};
     std::array<iovec, 3> remote{};
@@ -75,15 +75,15 @@ bool deliver(pid_t process, const SgRequest& request, ScsiReply& reply) {
 } // namespace
 
 FileDescriptor installSgIoFilter() {
-    constexpr auto at = [](std::size_t offset) { return static_cast<std::uint32_t>(offset); };
+    const auto at = [](std::size_t offset) { return static_cast<std::uint32_t>(offset); };
     // Fields of the 64-bit arguments are read as their low, first, half: a request number has 32 bits.
     std::array<sock_filter, 10> program = {{
         BPF_STMT(BPF_LD | BPF_W | BPF_ABS, at(offsetof(seccomp_data, arch))),
         BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, AUDIT_ARCH_X86_64, 0, 2),
         BPF_STMT(BPF_LD | BPF_W | BPF_ABS, at(offsetof(seccomp_data, nr))),
-        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, ioctlNumber64, 2, 5),
+        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, kIoctlNumber64, 2, 5),
         BPF_STMT(BPF_LD | BPF_W | BPF_ABS, at(offsetof(seccomp_data, nr))),
-        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, ioctlNumber32, 0, 3),
+        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, kIoctlNumber32, 0, 3),
         BPF_STMT(BPF_LD | BPF_W | BPF_ABS, at(offsetof(seccomp_data, args[1]))),
         BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SG_IO, 0, 1),
         BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_USER_NOTIF),
@@ -129,7 +129,7 @@ int Supervisor::serve(const seccomp_notif& call, int initDescriptor) {
     const bool wide = call.data.arch == AUDIT_ARCH_X86_64;
     Node* node = nodeOf(process, static_cast<int>(call.data.args[0]));
     const auto request = readSgHeader(process, call.data.args[2], wide);
-    std::array<std::uint8_t, longestCdb> bytes{};
+    std::array<std::uint8_t, kLongestCdb> bytes{};
     const std::size_t cdbLength = request ? std::min<std::size_t>(request->cdbLength, bytes.size()) : 0;
     const bool readable =
         request && (cdbLength == 0 || readMemory(process, request->cdb, bytes.data(), cdbLength));
@@ -146,7 +146,7 @@ int Supervisor::serve(const seccomp_notif& call, int initDescriptor) {
     if (request->interfaceId != 'S' || request->scatterCount != 0) {
         return EINVAL;
     }
-    if (request->cdbLength > longestCdb) {
+    if (request->cdbLength > kLongestCdb) {
         return EMSGSIZE;
     }
 

@@ -16,7 +16,7 @@ int hexDigit(char c) {
     return lower >= 'a' && lower <= 'f' ? lower - 'a' + 10 : -1;
 }
 
-constexpr unsigned longestNumber = 20; // digits of a 64-bit number
+constexpr unsigned kLongestNumber = 20; // digits of a 64-bit number
 
 // The number as a placeholder "{n}", "{n:04}" or "{n:08x}" writes it; `format` is what follows "n".
 std::string numberAs(std::uint64_t number, std::string_view format, const std::string& where) {
@@ -32,8 +32,8 @@ std::string numberAs(std::uint64_t number, std::string_view format, const std::s
         throw DescriptionError(where + ": a placeholder is {n}, {n:04} or {n:08x}, not {n" +
                                std::string(format) + "}");
     }
-    if (width > longestNumber) {
-        throw DescriptionError(where + ": a placeholder has at most " + std::to_string(longestNumber) +
+    if (width > kLongestNumber) {
+        throw DescriptionError(where + ": a placeholder has at most " + std::to_string(kLongestNumber) +
                                " digits");
     }
     std::ostringstream text;

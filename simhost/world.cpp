@@ -22,10 +22,10 @@ namespace fs = std::filesystem;
 
 // The new root is built here: the real /sys is the one directory that no simulated host shows, and it is
 // there on every Linux machine, so that no directory need be made for the purpose.
-const fs::path buildRoot = "/sys";
+const fs::path kBuildRoot = "/sys";
 
 fs::path inRoot(const fs::path& path) {
-    return buildRoot / path.relative_path();
+    return kBuildRoot / path.relative_path();
 }
 
 void mountAt(const char* source, const fs::path& target, const char* type, unsigned long flags,
@@ -60,13 +60,13 @@ void bindRealDirectories() {
             continue;
         }
         if (entry.is_symlink()) {
-            fs::copy_symlink(entry.path(), buildRoot / name);
+            fs::copy_symlink(entry.path(), kBuildRoot / name);
         } else if (entry.is_directory()) {
-            fs::create_directory(buildRoot / name);
-            bind(entry.path(), buildRoot / name);
+            fs::create_directory(kBuildRoot / name);
+            bind(entry.path(), kBuildRoot / name);
         } else if (entry.is_regular_file()) {
-            writeFile(buildRoot / name, {});
-            bind(entry.path(), buildRoot / name);
+            writeFile(kBuildRoot / name, {});
+            bind(entry.path(), kBuildRoot / name);
         }
     }
 }
@@ -89,7 +89,7 @@ fs::path coverDirectory(const fs::path& directory, const fs::path& layers) {
 // ---- The described part ----
 
 void makeDevices(const std::vector<Disk>& disks) {
-    const fs::path dev = buildRoot / "dev";
+    const fs::path dev = kBuildRoot / "dev";
     fs::create_directories(dev / "shm");
     for (const char* name : {"null", "zero", "full", "random", "urandom", "tty"}) {
         writeFile(dev / name, {});
@@ -149,7 +149,7 @@ void makeBlockEntry(const fs::path& directory, const BlockEntry& entry) {
 // Fills /sys/block so that it is read in the described order: tmpfs lists the newest entry first on some
 // kernels and the oldest on others.
 void makeSysBlock(const std::vector<BlockEntry>& entries) {
-    const fs::path directory = buildRoot / "sys/block";
+    const fs::path directory = kBuildRoot / "sys/block";
     fs::create_directories(directory);
     if (entries.empty()) {
         return;
@@ -195,7 +195,7 @@ void makeFile(const fs::path& path, const File& file, const fs::path& placeHolde
         if (!inProc) {
             writeFile(target, {});
         }
-        bind(buildRoot / "proc/1/mem", target); // address 0 of the first process: EIO
+        bind(kBuildRoot / "proc/1/mem", target); // address 0 of the first process: EIO
         return;
     case File::Kind::Link:
         fs::create_symlink(file.content, target);
@@ -251,14 +251,14 @@ void copyTree(const fs::path& from, const fs::path& to) {
 void enterWorld(const Host& host, const Helpers& helpers, const fs::path& record, const fs::path& keep) {
     const fs::path workingDirectory = fs::current_path();
     mountAt(nullptr, "/", nullptr, MS_REC | MS_PRIVATE);
-    mountAt("simhost", buildRoot, "tmpfs", 0, "mode=755");
+    mountAt("simhost", kBuildRoot, "tmpfs", 0, "mode=755");
     bindRealDirectories();
 
-    const fs::path own = buildRoot / ".simhost"; // what only the helpers look at
+    const fs::path own = kBuildRoot / ".simhost"; // what only the helpers look at
     const fs::path layers = own / "layers";
     std::map<fs::path, fs::path> covered; // directory → its changed files
     covered["/etc"];
-    for (const char* command : commandPaths) {
+    for (const char* command : kCommandPaths) {
         covered[fs::canonical(fs::path(command).parent_path())];
     }
     for (auto& [directory, changed] : covered) {
@@ -266,12 +266,12 @@ void enterWorld(const Host& host, const Helpers& helpers, const fs::path& record
     }
 
     makeDevices(host.disks);
-    fs::create_directory(buildRoot / "sys");
+    fs::create_directory(kBuildRoot / "sys");
     if (host.sysBlock) {
         makeSysBlock(*host.sysBlock);
     }
-    fs::create_directory(buildRoot / "proc");
-    mountAt("proc", buildRoot / "proc", "proc", 0);
+    fs::create_directory(kBuildRoot / "proc");
+    mountAt("proc", kBuildRoot / "proc", "proc", 0);
 
     fs::remove(inRoot("/etc/hba.conf"));
     fs::remove(inRoot("/etc/iscsi/initiatorname.iscsi"));
@@ -279,7 +279,7 @@ void enterWorld(const Host& host, const Helpers& helpers, const fs::path& record
         makeFile(path, file, own / "partitions");
     }
 
-    for (const char* command : commandPaths) {
+    for (const char* command : kCommandPaths) {
         fs::remove(inRoot(command));
     }
     for (const auto& [path, answers] : host.commands) {
@@ -288,7 +288,7 @@ void enterWorld(const Host& host, const Helpers& helpers, const fs::path& record
     bindFile(helpers.command, own / "command");
 
     if (host.vendorLibrary) {
-        writeFile(inRoot(adapterFilePath), adapterFile(*host.vendorLibrary, host.adapters));
+        writeFile(inRoot(kAdapterFilePath), adapterFile(*host.vendorLibrary, host.adapters));
         bindFile(helpers.vendorLibrary64, own / "lib/x86_64-linux-gnu/libsimhba.so");
         for (const char* folder : {"lib32", "lib/i386-linux-gnu"}) { // as multilib and i386 packages have it
             bindFile(helpers.vendorLibrary32, own / folder / "libsimhba.so");
@@ -299,20 +299,20 @@ void enterWorld(const Host& host, const Helpers& helpers, const fs::path& record
     }
     if (!keep.empty()) {
         for (const char* part : {"dev", "sys", ".simhost/commands"}) {
-            if (fs::exists(buildRoot / part)) {
-                copyTree(buildRoot / part, keep / fs::path(part).filename());
+            if (fs::exists(kBuildRoot / part)) {
+                copyTree(kBuildRoot / part, keep / fs::path(part).filename());
             }
         }
         for (const auto& [directory, changed] : covered) {
             copyTree(changed, keep / directory.relative_path());
         }
         if (host.vendorLibrary) {
-            fs::copy_file(inRoot(adapterFilePath), keep / "adapters", fs::copy_options::overwrite_existing);
+            fs::copy_file(inRoot(kAdapterFilePath), keep / "adapters", fs::copy_options::overwrite_existing);
         }
     }
 
     check(::sethostname(host.hostName.data(), host.hostName.size()), "setting the host name");
-    fs::current_path(buildRoot);
+    fs::current_path(kBuildRoot);
     check(::syscall(SYS_pivot_root, ".", "."), "changing the root"); // the old root now covers the new one
     check(::umount2(".", MNT_DETACH), "leaving the old root");
     fs::current_path(workingDirectory);

@@ -12,7 +12,7 @@
 
 namespace {
 
-constexpr const char* ownFolder = "/.simhost/";
+constexpr const char* kOwnFolder = "/.simhost/";
 
 // The number in a file that simhost wrote.
 long numberIn(const std::string& path) {
@@ -54,7 +54,7 @@ void print(const std::string& path, int to) {
 }
 
 void record(char** arguments) {
-    const int file = ::open((std::string(ownFolder) + "record").c_str(), O_WRONLY | O_APPEND | O_CLOEXEC);
+    const int file = ::open((std::string(kOwnFolder) + "record").c_str(), O_WRONLY | O_APPEND | O_CLOEXEC);
     if (file < 0) {
         return; // nobody asked for one
     }
@@ -78,7 +78,7 @@ int main(int argumentCount, char** arguments) {
     record(arguments);
     const char* slash = std::strrchr(arguments[0], '/');
     const std::string name = slash == nullptr ? arguments[0] : slash + 1;
-    const std::string folder = std::string(ownFolder) + "commands/" + name + "/";
+    const std::string folder = std::string(kOwnFolder) + "commands/" + name + "/";
     const long last = numberIn(folder + "answers") - 1;
     const long call = countCall(folder + "calls");
     const std::string answer = folder + std::to_string(call < last ? call : last) + "/";

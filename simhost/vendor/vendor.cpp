@@ -36,7 +36,7 @@ bool mapAdapters() {
     if (gAdapters.mapped != MAP_FAILED) {
         return true;
     }
-    const int file = ::open(adapterFilePath, O_RDONLY | O_CLOEXEC);
+    const int file = ::open(kAdapterFilePath, O_RDONLY | O_CLOEXEC);
     struct stat entry {};
     if (file < 0 || ::fstat(file, &entry) != 0) {
         return false;

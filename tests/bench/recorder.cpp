@@ -210,15 +210,15 @@ int gDevice = -1; // the node that is open
 extern "C" {
 
 std::size_t fwrite_unlocked(const void* text, std::size_t size, std::size_t count, std::FILE* stream) {
-    static auto* const sReal = real(&fwrite_unlocked, "fwrite_unlocked");
+    static auto* const kReal = real(&fwrite_unlocked, "fwrite_unlocked");
     if (isOwnCall(__builtin_return_address(0))) {
         gGathered.append(static_cast<const char*>(text), size * count);
     }
-    return sReal(text, size, count, stream);
+    return kReal(text, size, count, stream);
 }
 
 int __vfprintf_chk(std::FILE* stream, int flag, const char* format, va_list arguments) {
-    static auto* const sReal = real(&__vfprintf_chk, "__vfprintf_chk");
+    static auto* const kReal = real(&__vfprintf_chk, "__vfprintf_chk");
     if (stream != stdout && isOwnCall(__builtin_return_address(0))) {
         recordGathered();
         va_list copy;
@@ -226,13 +226,13 @@ int __vfprintf_chk(std::FILE* stream, int flag, const char* format, va_list argu
         recordPrint(format, copy);
         va_end(copy);
     }
-    return sReal(stream, flag, format, arguments);
+    return kReal(stream, flag, format, arguments);
 }
 
 // Morvane creates no file with open, so the mode says nothing.
 int open(const char* path, int flags, ...) {
-    static auto* const sReal = real(&open, "open");
-    const int fd = sReal(path, flags, 0);
+    static auto* const kReal = real(&open, "open");
+    const int fd = kReal(path, flags, 0);
     if (fd >= 0 && isDevice(path) && isOwnCall(__builtin_return_address(0))) {
         recordGathered();
         gRecorder->number(kOpen, 1);
@@ -243,17 +243,17 @@ int open(const char* path, int flags, ...) {
 }
 
 int close(int fd) {
-    static auto* const sReal = real(&close, "close");
+    static auto* const kReal = real(&close, "close");
     if (fd == gDevice && isOwnCall(__builtin_return_address(0))) {
         recordGathered();
         gRecorder->number(kClose, 1);
         gDevice = -1;
     }
-    return sReal(fd);
+    return kReal(fd);
 }
 
 int ioctl(int fd, unsigned long request, ...) noexcept {
-    static auto* const sReal = real(&ioctl, "ioctl");
+    static auto* const kReal = real(&ioctl, "ioctl");
     va_list arguments;
     va_start(arguments, request);
     auto* const header = va_arg(arguments, sg_io_hdr*);
@@ -265,7 +265,7 @@ int ioctl(int fd, unsigned long request, ...) noexcept {
         gRecorder->bytes(header->cmdp, header->cmd_len);
         gRecorder->number(header->dxfer_len, 4);
     }
-    return sReal(fd, request, header);
+    return kReal(fd, request, header);
 }
 
 } // extern "C"

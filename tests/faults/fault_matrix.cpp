@@ -132,11 +132,11 @@ bool endsInAssertion(const std::string& log) {
 
 // The log's whole lines, without what differs from run to run: times, addresses.
 std::vector<std::string> comparableLines(const std::string& log) {
-    static const std::regex sVolatile("0x[0-9a-f]{6,}|[0-9]+\\.[0-9]{2}");
+    static const std::regex kVolatile("0x[0-9a-f]{6,}|[0-9]+\\.[0-9]{2}");
     std::vector<std::string> lines;
     std::istringstream stream(log.substr(0, log.rfind('\n') + 1));
     for (std::string line; std::getline(stream, line);) {
-        lines.push_back(std::regex_replace(line, sVolatile, "#"));
+        lines.push_back(std::regex_replace(line, kVolatile, "#"));
     }
     return lines;
 }

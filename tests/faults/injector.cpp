@@ -234,33 +234,33 @@ void* calloc(std::size_t count, std::size_t size) noexcept {
 }
 
 std::FILE* fopen(const char* path, const char* mode) {
-    static auto* const sReal = real(&fopen, "fopen");
-    return OWN_CALL_FAILS(kLogOpen) ? (failWith(EMFILE), nullptr) : sReal(path, mode);
+    static auto* const kReal = real(&fopen, "fopen");
+    return OWN_CALL_FAILS(kLogOpen) ? (failWith(EMFILE), nullptr) : kReal(path, mode);
 }
 
 std::FILE* fopen64(const char* path, const char* mode) {
-    static auto* const sReal = real(&fopen64, "fopen64");
-    return OWN_CALL_FAILS(kLogOpen) ? (failWith(EMFILE), nullptr) : sReal(path, mode);
+    static auto* const kReal = real(&fopen64, "fopen64");
+    return OWN_CALL_FAILS(kLogOpen) ? (failWith(EMFILE), nullptr) : kReal(path, mode);
 }
 
 // Morvane creates no file with open, so the mode says nothing.
 int open(const char* path, int flags, ...) {
-    static auto* const sReal = real(&open, "open");
-    return OWN_CALL_FAILS(kDeviceOpen) ? failWith(EMFILE) : sReal(path, flags, 0600);
+    static auto* const kReal = real(&open, "open");
+    return OWN_CALL_FAILS(kDeviceOpen) ? failWith(EMFILE) : kReal(path, flags, 0600);
 }
 
 int open64(const char* path, int flags, ...) {
-    static auto* const sReal = real(&open64, "open64");
-    return OWN_CALL_FAILS(kDeviceOpen) ? failWith(EMFILE) : sReal(path, flags, 0600);
+    static auto* const kReal = real(&open64, "open64");
+    return OWN_CALL_FAILS(kDeviceOpen) ? failWith(EMFILE) : kReal(path, flags, 0600);
 }
 
 DIR* opendir(const char* path) {
-    static auto* const sReal = real(&opendir, "opendir");
-    return OWN_CALL_FAILS(kDirectoryOpen) ? (failWith(EACCES), nullptr) : sReal(path);
+    static auto* const kReal = real(&opendir, "opendir");
+    return OWN_CALL_FAILS(kDirectoryOpen) ? (failWith(EACCES), nullptr) : kReal(path);
 }
 
 std::FILE* popen(const char* command, const char* mode) {
-    static auto* const sReal = real(&popen, "popen");
+    static auto* const kReal = real(&popen, "popen");
     if (OWN_CALL_FAILS(kPopen)) {
         errno = ENOMEM;
         return nullptr;
@@ -268,51 +268,51 @@ std::FILE* popen(const char* command, const char* mode) {
     if (OWN_CALL_FAILS(kFork)) {
         refuseForks();
     }
-    return sReal(command, mode);
+    return kReal(command, mode);
 }
 
 std::size_t fread(void* buffer, std::size_t size, std::size_t count, std::FILE* stream) {
-    static auto* const sReal = real(&fread, "fread");
-    return OWN_CALL_FAILS(kRead) ? (setError(stream), 0) : sReal(buffer, size, count, stream);
+    static auto* const kReal = real(&fread, "fread");
+    return OWN_CALL_FAILS(kRead) ? (setError(stream), 0) : kReal(buffer, size, count, stream);
 }
 
 char* fgets(char* buffer, int size, std::FILE* stream) {
-    static auto* const sReal = real(&fgets, "fgets");
-    return OWN_CALL_FAILS(kRead) ? (setError(stream), nullptr) : sReal(buffer, size, stream);
+    static auto* const kReal = real(&fgets, "fgets");
+    return OWN_CALL_FAILS(kRead) ? (setError(stream), nullptr) : kReal(buffer, size, stream);
 }
 
 ssize_t __getdelim(char** line, std::size_t* size, int delimiter, std::FILE* stream) {
-    static auto* const sReal = real(&__getdelim, "__getdelim");
-    return OWN_CALL_FAILS(kRead) ? (setError(stream), -1) : sReal(line, size, delimiter, stream);
+    static auto* const kReal = real(&__getdelim, "__getdelim");
+    return OWN_CALL_FAILS(kRead) ? (setError(stream), -1) : kReal(line, size, delimiter, stream);
 }
 
 #pragma GCC diagnostic push
 #pragma GCC diagnostic ignored "-Wdeprecated-declarations" // readdir_r, ftime: what Morvane calls
 int readdir_r(DIR* directory, dirent* entry, dirent** result) {
-    static auto* const sReal = real(&readdir_r, "readdir_r");
-    return OWN_CALL_FAILS(kDirectoryRead) ? EIO : sReal(directory, entry, result);
+    static auto* const kReal = real(&readdir_r, "readdir_r");
+    return OWN_CALL_FAILS(kDirectoryRead) ? EIO : kReal(directory, entry, result);
 }
 
 int readdir64_r(DIR* directory, dirent64* entry, dirent64** result) {
-    static auto* const sReal = real(&readdir64_r, "readdir64_r");
-    return OWN_CALL_FAILS(kDirectoryRead) ? EIO : sReal(directory, entry, result);
+    static auto* const kReal = real(&readdir64_r, "readdir64_r");
+    return OWN_CALL_FAILS(kDirectoryRead) ? EIO : kReal(directory, entry, result);
 }
 
 int ftime(timeb* now) {
-    static auto* const sReal = real(&ftime, "ftime");
-    const int result = sReal(now);
+    static auto* const kReal = real(&ftime, "ftime");
+    const int result = kReal(now);
     now->time += gPlan.clockShiftSeconds;
     return result;
 }
 #pragma GCC diagnostic pop
 
 ssize_t readlink(const char* path, char* buffer, std::size_t size) noexcept {
-    static auto* const sReal = real(&readlink, "readlink");
-    return OWN_CALL_FAILS(kLinkRead) ? failWith(EIO) : sReal(path, buffer, size);
+    static auto* const kReal = real(&readlink, "readlink");
+    return OWN_CALL_FAILS(kLinkRead) ? failWith(EIO) : kReal(path, buffer, size);
 }
 
 int ioctl(int fd, unsigned long request, ...) noexcept {
-    static auto* const sReal = real(&ioctl, "ioctl");
+    static auto* const kReal = real(&ioctl, "ioctl");
     constexpr long kLateSeconds = 11;
     va_list arguments;
     va_start(arguments, request);
@@ -324,51 +324,51 @@ int ioctl(int fd, unsigned long request, ...) noexcept {
     if (OWN_CALL_FAILS(kLateAnswer)) {
         gPlan.clockShiftSeconds += kLateSeconds;
     }
-    return sReal(fd, request, argument);
+    return kReal(fd, request, argument);
 }
 
 int __vfprintf_chk(std::FILE* stream, int flag, const char* format, va_list arguments) {
-    static auto* const sReal = real(&__vfprintf_chk, "__vfprintf_chk");
-    return OWN_CALL_FAILS(kLogWrite) ? (setError(stream), -1) : sReal(stream, flag, format, arguments);
+    static auto* const kReal = real(&__vfprintf_chk, "__vfprintf_chk");
+    return OWN_CALL_FAILS(kLogWrite) ? (setError(stream), -1) : kReal(stream, flag, format, arguments);
 }
 
 int close(int fd) {
-    static auto* const sReal = real(&close, "close");
+    static auto* const kReal = real(&close, "close");
     const bool isToFail = OWN_CALL_FAILS(kClose);
-    const int result = sReal(fd);
+    const int result = kReal(fd);
     return isToFail ? failWith(EIO) : result;
 }
 
 int fclose(std::FILE* stream) {
-    static auto* const sReal = real(&fclose, "fclose");
+    static auto* const kReal = real(&fclose, "fclose");
     const bool isToFail = OWN_CALL_FAILS(kClose);
-    const int result = sReal(stream);
+    const int result = kReal(stream);
     return isToFail ? failWith(EIO) : result;
 }
 
 int stat(const char* path, struct stat* status) noexcept {
-    static auto* const sReal = real(&stat, "stat");
-    return OWN_CALL_FAILS(kStat) ? failWith(EACCES) : sReal(path, status);
+    static auto* const kReal = real(&stat, "stat");
+    return OWN_CALL_FAILS(kStat) ? failWith(EACCES) : kReal(path, status);
 }
 
 int stat64(const char* path, struct stat64* status) noexcept {
-    static auto* const sReal = real(&stat64, "stat64");
-    return OWN_CALL_FAILS(kStat) ? failWith(EACCES) : sReal(path, status);
+    static auto* const kReal = real(&stat64, "stat64");
+    return OWN_CALL_FAILS(kStat) ? failWith(EACCES) : kReal(path, status);
 }
 
 int mkdir(const char* path, mode_t mode) noexcept {
-    static auto* const sReal = real(&mkdir, "mkdir");
-    return OWN_CALL_FAILS(kMkdir) ? failWith(EROFS) : sReal(path, mode);
+    static auto* const kReal = real(&mkdir, "mkdir");
+    return OWN_CALL_FAILS(kMkdir) ? failWith(EROFS) : kReal(path, mode);
 }
 
 int gethostname(char* name, std::size_t size) noexcept {
-    static auto* const sReal = real(&gethostname, "gethostname");
-    return OWN_CALL_FAILS(kHostName) ? failWith(EPERM) : sReal(name, size);
+    static auto* const kReal = real(&gethostname, "gethostname");
+    return OWN_CALL_FAILS(kHostName) ? failWith(EPERM) : kReal(name, size);
 }
 
 int usleep(useconds_t microseconds) {
-    static auto* const sReal = real(&usleep, "usleep");
-    return OWN_CALL_FAILS(kSleep) ? failWith(EINTR) : sReal(microseconds);
+    static auto* const kReal = real(&usleep, "usleep");
+    return OWN_CALL_FAILS(kSleep) ? failWith(EINTR) : kReal(microseconds);
 }
 
 } // extern "C"

@@ -67,8 +67,8 @@ void checkPage(const nlohmann::ordered_json& document) {
         const std::string page = output.str();
         return std::count(page.begin(), page.end(), '<');
     };
-    static const auto templateMarkup = markup({});
-    require(markup(document) == templateMarkup, "markup from the log");
+    static const auto kTemplateMarkup = markup({});
+    require(markup(document) == kTemplateMarkup, "markup from the log");
 }
 
 void checkDifference(const Model& before, const Model& after) {

@@ -95,19 +95,19 @@ std::string visible(std::string_view line) {
             result += c;
             continue;
         }
-        constexpr std::string_view digits = "0123456789abcdef";
+        constexpr std::string_view kDigits = "0123456789abcdef";
         result += "\\x";
-        result += digits[byte >> 4U];
-        result += digits[byte & 0xfU];
+        result += kDigits[byte >> 4U];
+        result += kDigits[byte & 0xfU];
     }
     return result;
 }
 
 std::string excerpt(const std::vector<std::string_view>& lines, std::size_t place) {
-    constexpr std::size_t context = 6;
+    constexpr std::size_t kContext = 6;
     std::string text;
-    const std::size_t end = std::min(lines.size(), place + context);
-    for (std::size_t i = place < context ? 0 : place - context; i < end; ++i) {
+    const std::size_t end = std::min(lines.size(), place + kContext);
+    for (std::size_t i = place < kContext ? 0 : place - kContext; i < end; ++i) {
         text += (i == place ? "  > " : "    ") + visible(lines[i]) + "\n";
     }
     return lines.size() <= place ? text + "  > (end)\n" : text;

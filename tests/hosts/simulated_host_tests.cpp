@@ -25,14 +25,14 @@ namespace fs = std::filesystem;
 
 using Texts = std::map<std::string, std::string>; // by the name of the file that holds the expected one
 
-const Texts defaults = {
+const Texts kDefaults = {
     {"expected.output", "Test completed.\n"}, {"expected.error", ""}, {"expected.status", "0\n"}};
 
-const fs::path hostsFolder = HOSTS_FOLDER;
+const fs::path kHostsFolder = HOSTS_FOLDER;
 
 std::vector<std::string> hostNames() {
     std::vector<std::string> names;
-    for (const auto& entry : fs::directory_iterator(hostsFolder)) {
+    for (const auto& entry : fs::directory_iterator(kHostsFolder)) {
         if (fs::exists(entry.path() / "host.toml")) {
             names.push_back(entry.path().filename());
         }
@@ -59,7 +59,7 @@ Texts runOnHost(const std::string& name) {
     const fs::path work = scratch.path() / "work";
     const fs::path record = scratch.path() / "record";
     fs::create_directory(work);
-    const ProcessResult result = runProcess({SIMHOST_PROGRAM, hostsFolder / name / "host.toml", "--record",
+    const ProcessResult result = runProcess({SIMHOST_PROGRAM, kHostsFolder / name / "host.toml", "--record",
                                              record.string(), "--", MORVANE_PROGRAM},
                                             work);
     return {{"expected.log", normalised(contentOf(work / "MorvaneLogs/Morvane.log"))},
@@ -71,8 +71,8 @@ Texts runOnHost(const std::string& name) {
 
 void accept(const fs::path& folder, const Texts& texts) {
     for (const auto& [file, text] : texts) {
-        const auto usual = defaults.find(file);
-        if (usual != defaults.end() && usual->second == text) {
+        const auto usual = kDefaults.find(file);
+        if (usual != kDefaults.end() && usual->second == text) {
             fs::remove(folder / file);
         } else {
             std::ofstream(folder / file, std::ios::binary) << text;
@@ -83,18 +83,18 @@ void accept(const fs::path& folder, const Texts& texts) {
 class SimulatedHost : public testing::TestWithParam<std::string> {};
 
 TEST_P(SimulatedHost, isReportedAsExpected) {
-    const fs::path folder = hostsFolder / GetParam();
+    const fs::path folder = kHostsFolder / GetParam();
     const Texts actual = runOnHost(GetParam());
     if (std::getenv("MORVANE_ACCEPT") != nullptr) {
         accept(folder, actual);
         return;
     }
     for (const auto& [file, text] : actual) {
-        const auto usual = defaults.find(file);
+        const auto usual = kDefaults.find(file);
         const bool stored = fs::exists(folder / file);
-        EXPECT_TRUE(stored || usual != defaults.end()) << "no " << file;
+        EXPECT_TRUE(stored || usual != kDefaults.end()) << "no " << file;
         const std::string difference = firstDifference(
-            stored || usual == defaults.end() ? contentOf(folder / file) : usual->second, text);
+            stored || usual == kDefaults.end() ? contentOf(folder / file) : usual->second, text);
         EXPECT_TRUE(difference.empty()) << file << ": " << difference;
     }
 }

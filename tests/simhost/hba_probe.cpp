@@ -15,16 +15,16 @@ void printWwn(const HBA_WWN& wwn) {
     }
 }
 
-constexpr HBA_UINT32 room = 8; // entries that the mapping buffer holds
+constexpr HBA_UINT32 kRoom = 8; // entries that the mapping buffer holds
 
 void printMapping(HBA_HANDLE handle, HBA_UINT32 asked) {
     const std::unique_ptr<void, decltype(&std::free)> buffer(
-        std::calloc(1, sizeof(HBA_FCPTARGETMAPPING) + room * sizeof(HBA_FCPSCSIENTRY)), std::free);
+        std::calloc(1, sizeof(HBA_FCPTARGETMAPPING) + kRoom * sizeof(HBA_FCPSCSIENTRY)), std::free);
     auto* mapping = static_cast<HBA_FCPTARGETMAPPING*>(buffer.get());
     mapping->NumberOfEntries = asked;
     const HBA_STATUS status = HBA_GetFcpTargetMapping(handle, mapping);
     std::printf("  mapping of %u: status %u, %u entries\n", asked, status, mapping->NumberOfEntries);
-    for (HBA_UINT32 i = 0; i < room; ++i) {
+    for (HBA_UINT32 i = 0; i < kRoom; ++i) {
         const HBA_FCPSCSIENTRY& entry = mapping->entry[i];
         if (entry.ScsiId.OSDeviceName[0] == '\0') {
             continue;
@@ -61,7 +61,7 @@ void printAdapter(HBA_UINT32 index) {
         std::printf("\n");
     }
     printMapping(handle, 1);
-    printMapping(handle, room);
+    printMapping(handle, kRoom);
     HBA_CloseAdapter(handle);
 }
 

@@ -13,21 +13,21 @@
 
 namespace {
 
-constexpr unsigned char untouched = 0xee; // what the buffers hold before the command
+constexpr unsigned char kUntouched = 0xee; // what the buffers hold before the command
 
 std::string hexOf(const unsigned char* bytes, std::size_t count) {
     std::string text;
-    constexpr char digits[] = "0123456789abcdef";
+    constexpr char kDigits[] = "0123456789abcdef";
     for (std::size_t i = 0; i < count; ++i) {
-        text += digits[bytes[i] >> 4U];
-        text += digits[bytes[i] & 0xfU];
+        text += kDigits[bytes[i] >> 4U];
+        text += kDigits[bytes[i] & 0xfU];
     }
     return text;
 }
 
 // How many bytes from the start were written.
 std::size_t writtenOf(const unsigned char* bytes, std::size_t size) {
-    while (size > 0 && bytes[size - 1] == untouched) {
+    while (size > 0 && bytes[size - 1] == kUntouched) {
         --size;
     }
     return size;
@@ -46,8 +46,8 @@ void send(const char* node, const std::string& cdbText) {
     }
     unsigned char data[64];
     unsigned char sense[32];
-    std::memset(data, untouched, sizeof data);
-    std::memset(sense, untouched, sizeof sense);
+    std::memset(data, kUntouched, sizeof data);
+    std::memset(sense, kUntouched, sizeof sense);
     sg_io_hdr header{};
     header.interface_id = 'S';
     header.dxfer_direction = SG_DXFER_FROM_DEV;

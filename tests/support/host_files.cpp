@@ -79,9 +79,9 @@ std::vector<std::string> HostFiles::entries(const std::string& path) const {
 extern "C" {
 
 std::FILE* fopen(const char* filename, const char* modes) {
-    static auto* const real = reinterpret_cast<std::FILE* (*)(const char*, const char*)>(
+    static auto* const kReal = reinterpret_cast<std::FILE* (*)(const char*, const char*)>(
         dlsym(RTLD_NEXT, sizeof(off_t) > sizeof(long) ? "fopen64" : "fopen"));
-    return real(resolved(filename).c_str(), modes);
+    return kReal(resolved(filename).c_str(), modes);
 }
 
 DIR* opendir(const char* name) {

@@ -15,7 +15,7 @@
 namespace test {
 namespace {
 
-constexpr int cannotStart = 126;
+constexpr int kCannotStart = 126;
 
 // In the child: never returns.
 [[noreturn]] void become(const std::vector<char*>& arguments, const std::filesystem::path& directory,
@@ -26,13 +26,13 @@ constexpr int cannotStart = 126;
     const int err = ::open(error.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
     if (::dup2(in, STDIN_FILENO) < 0 || ::dup2(out, STDOUT_FILENO) < 0 || ::dup2(err, STDERR_FILENO) < 0 ||
         ::chdir(directory.c_str()) != 0) {
-        ::_exit(cannotStart);
+        ::_exit(kCannotStart);
     }
     ::close(in);
     ::close(out);
     ::close(err);
     ::execv(arguments[0], arguments.data());
-    ::_exit(cannotStart);
+    ::_exit(kCannotStart);
 }
 
 } // namespace
