@@ -16,6 +16,8 @@ int hexDigit(char c) {
     return lower >= 'a' && lower <= 'f' ? lower - 'a' + 10 : -1;
 }
 
+constexpr std::uint64_t kMostCopies = 1000000; // each is a table of its own in memory
+
 constexpr unsigned kLongestNumber = 20; // digits of a 64-bit number
 
 // The number as a placeholder "{n}", "{n:04}" or "{n:08x}" writes it; `format` is what follows "n".
@@ -155,7 +157,7 @@ bool isPlain(const std::string& path) {
 
 std::vector<toml::table> unrolled(const toml::table& entry, const std::string& where) {
     Keys keys(entry, where);
-    const auto count = keys.number("count");
+    const auto count = keys.number("count", kMostCopies);
     const std::uint64_t first = keys.number("first").value_or(0);
     if (!count) {
         return {entry};

@@ -536,6 +536,8 @@ TEST(SimHostDescription, isRefusedWhereAValueDoesNotFitItsField) {
               "host.toml: disk 0: a page has at most 65535 bytes\n");
     EXPECT_EQ(complaint("partitions = [{ name = 'sd{n:099}', count = 1 }]\n"),
               "host.toml: partitions 0: a placeholder has at most 20 digits\n");
+    EXPECT_EQ(complaint("partitions = [{ name = 'sd{n}', count = 1000001 }]\n"),
+              "host.toml: line 1: partitions 0.count: must be a number from 0 to 1000000\n");
 }
 
 // The directories around the described ones are the real machine's.
