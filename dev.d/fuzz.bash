@@ -4,7 +4,7 @@
 fuzz_packages=(clang libclang-rt-14-dev llvm "${view_packages[@]}")
 
 # The parsing code: what the fuzz targets are there for. All of morvane-view works on what its reader found.
-fuzzed_sources=(scsi fc/unique_lun_id.cpp host/iscsi_tree.cpp host/logical_tree.cpp multipath view)
+fuzzed_sources=(scsi fc/identity host/iscsi_listing.cpp host/logical_tree.cpp multipath view)
 
 cmd_fuzz() {
     need "${run_packages[@]}" "${fuzz_packages[@]}"
