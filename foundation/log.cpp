@@ -67,7 +67,7 @@ struct GatheredText {
 namespace {
 
 // The number of characters, or a negative number when the stream refuses them.
-int putFormatted(const char* format, std::va_list arguments) noexcept {
+[[gnu::format(printf, 1, 0)]] int putFormatted(const char* format, std::va_list arguments) noexcept {
     std::FILE* const stream = logStream();
     if (!GatheredText::pass(stream)) {
         return -1;

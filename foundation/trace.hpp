@@ -20,7 +20,7 @@ class FunctionTrace {
 public:
     // `name` outlives the object.
     explicit FunctionTrace(const char* name, unsigned line = __builtin_LINE());
-    FunctionTrace(std::nothrow_t, const char* name, unsigned line = __builtin_LINE()) noexcept;
+    FunctionTrace(std::nothrow_t tag, const char* name, unsigned line = __builtin_LINE()) noexcept;
     FunctionTrace(const FunctionTrace&) = delete;
     FunctionTrace& operator=(const FunctionTrace&) = delete;
     ~FunctionTrace() = default;

@@ -42,29 +42,29 @@ struct MissingField {
 // The first field without which a command cannot be sent, or null. Two of the printed texts differ from the
 // exception's.
 const MissingField* missingField(const sg_io_hdr& header) {
-    static const MissingField sCmdp = {"No cmdp in IoObject\n", "No cmdp in IoObject\n"};
-    static const MissingField sSbp = {"No sbp in IoObject\n", "No sbp in IoObject\n"};
-    static const MissingField sSbLen = {"No sb len In IoObject\n", "No sb len In IoObject\n"};
-    static const MissingField sDxferp = {"No dxferp In IoObject\n", "No dxferp In IoObject\n"};
-    static const MissingField sDxferLen = {"No dxfer len in IoObject\n", "No dxfer len In IoObject\n"};
-    static const MissingField sDirection = {"No dxfer direction in IoObject\n",
+    static const MissingField kCmdp = {"No cmdp in IoObject\n", "No cmdp in IoObject\n"};
+    static const MissingField kSbp = {"No sbp in IoObject\n", "No sbp in IoObject\n"};
+    static const MissingField kSbLen = {"No sb len In IoObject\n", "No sb len In IoObject\n"};
+    static const MissingField kDxferp = {"No dxferp In IoObject\n", "No dxferp In IoObject\n"};
+    static const MissingField kDxferLen = {"No dxfer len in IoObject\n", "No dxfer len In IoObject\n"};
+    static const MissingField kDirection = {"No dxfer direction in IoObject\n",
                                             "No dxfer direction  In IoObject\n"};
     if (header.cmdp == nullptr) {
-        return &sCmdp;
+        return &kCmdp;
     }
     if (header.sbp == nullptr) {
-        return &sSbp;
+        return &kSbp;
     }
     if (header.sb_len_wr == 0) { // not mx_sb_len: the context presets both
-        return &sSbLen;
+        return &kSbLen;
     }
     if (header.dxferp == nullptr) {
-        return &sDxferp;
+        return &kDxferp;
     }
     if (header.dxfer_len == 0) {
-        return &sDxferLen;
+        return &kDxferLen;
     }
-    return header.dxfer_direction == 0 ? &sDirection : nullptr;
+    return header.dxfer_direction == 0 ? &kDirection : nullptr;
 }
 
 timeb wallClock() {

@@ -8,7 +8,7 @@ ZebTwoLevelMap<uint32>::Map DevMap;
 
 uint32 EmulexHash(const char* name) {
     constexpr uint32 kSeed = 9000;
-    constexpr uint32 m = 0x5BE1D995;
+    constexpr uint32 kMultiplier = 0x5BE1D995;
 
     std::size_t left = Clib_strlen(name);
     uint32 h = static_cast<uint32>(left) ^ kSeed;
@@ -16,10 +16,10 @@ uint32 EmulexHash(const char* name) {
     for (; left >= 4; left -= 4, byte += 4) {
         uint32 k = byte[0] | static_cast<uint32>(byte[1]) << 8 | static_cast<uint32>(byte[2]) << 16 |
                    static_cast<uint32>(byte[3]) << 24;
-        k *= m;
+        k *= kMultiplier;
         k ^= k >> 24;
-        k *= m;
-        h *= m;
+        k *= kMultiplier;
+        h *= kMultiplier;
         h ^= k;
     }
     switch (left) {
@@ -31,13 +31,13 @@ uint32 EmulexHash(const char* name) {
         [[fallthrough]];
     case 1:
         h ^= byte[0];
-        h *= m;
+        h *= kMultiplier;
         break;
     default:
         break;
     }
     h ^= h >> 13;
-    h *= m;
+    h *= kMultiplier;
     h ^= h >> 15;
     return h;
 }

@@ -16,8 +16,8 @@ constexpr char kClearLine[] = "\r\033[K";
 bool gIsShown = false;
 
 bool isTerminal() {
-    static const bool sIsTerminal = isatty(STDERR_FILENO) == 1;
-    return sIsTerminal;
+    static const bool kIsTerminal = isatty(STDERR_FILENO) == 1;
+    return kIsTerminal;
 }
 
 std::size_t columns() {

@@ -74,6 +74,7 @@ void respond(sg_io_hdr& header, std::string_view data) {
 CommandOutput::CommandOutput(const char* command) {
     if (const std::string* const output = gHost.command ? gHost.command(command) : nullptr) {
         mStream = memoryFile(*output);
+        mProcess = 0; // none to be waited for
     }
 }
 
