@@ -10,6 +10,7 @@
 #include <climits>
 #include <cstdlib>
 #include <exception>
+#include <string>
 
 #include "foundation/clib_error.hpp"
 #include "foundation/clib_path.hpp"
@@ -139,7 +140,7 @@ bool isSame(const struct stat& a, const struct stat& b) {
 // Opens the log that an earlier run of the user's left, emptied; -1 where there is no such log, and nothing
 // in its place any more.
 int reopenOwn(const struct stat& directory) {
-    const std::string path = std::string(kDirectory) + "/" + kName;
+    const std::string path = kLogFile;
     struct stat found {};
     if (fstatat(gDirectory, kName, &found, AT_SYMLINK_NOFOLLOW) != 0) {
         if (errno != ENOENT) {
@@ -176,8 +177,7 @@ int openFile(const struct stat& directory) {
     }
     const int file = openat(gDirectory, kName, O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, kFileMode);
     if (file < 0) {
-        throw Refusal{std::string(kDirectory) + "/" + kName + ": " + ErrnoText().text +
-                      inDirectoryOf(directory)};
+        throw Refusal{std::string(kLogFile) + ": " + ErrnoText().text + inDirectoryOf(directory)};
     }
     return file;
 }
@@ -190,6 +190,10 @@ void haveStandardDescriptors() {
             refuse("/dev/null", errno);
         }
     }
+}
+
+[[noreturn]] void failLog(int error) {
+    throw WriteFailedEx((std::string(kLogFile) + ": " + ErrnoText(error).text).c_str());
 }
 
 } // namespace
@@ -213,27 +217,19 @@ std::FILE* openLogFile() {
 }
 
 void completeLogFile(std::FILE* log) {
-    try {
-        flushLog();
-    } catch (const WriteFailedEx&) {
-        throw WriteFailedEx(logFailure(logError()).c_str());
-    }
+    flushLog();
     for (const int fd : {fileno(log), gDirectory}) {
         // A file system may have nothing to bring to a disk, or no way to do so for a directory.
         if (fsync(fd) != 0 && errno != EINVAL && errno != ENOSYS && errno != EOPNOTSUPP) {
-            throw WriteFailedEx(logFailure(errno).c_str());
+            failLog(errno);
         }
     }
     struct stat written {};
     struct stat named {};
     if (fstat(fileno(log), &written) != 0 || fstatat(gDirectory, kName, &named, AT_SYMLINK_NOFOLLOW) != 0) {
-        throw WriteFailedEx(logFailure(errno).c_str());
+        failLog(errno);
     }
     if (!isSame(written, named)) {
-        throw WriteFailedEx((std::string(kDirectory) + "/" + kName + ": replaced during the run").c_str());
+        throw WriteFailedEx((std::string(kLogFile) + ": replaced during the run").c_str());
     }
-}
-
-std::string logFailure(int error) {
-    return std::string(kDirectory) + "/" + kName + ": " + ErrnoText(error).text;
 }

@@ -2,9 +2,10 @@
 #pragma once
 
 #include <cstdio>
-#include <string>
 
-// Opens the run's log, ./MorvaneLogs/Morvane.log, empty, and keeps every other run out until the process
+constexpr const char* kLogFile = "./MorvaneLogs/Morvane.log";
+
+// Opens the run's log, kLogFile, empty, and keeps every other run out until the process
 // ends.
 //
 // The directory is made where it is missing (mode 0777, less the umask). It may be a link if the user or root
@@ -19,6 +20,3 @@ std::FILE* openLogFile();
 // Brings the log to the disk. Throws WriteFailedEx with a text that says what is missing: the log could not
 // take everything, or its file is no longer the one of its name.
 void completeLogFile(std::FILE* log);
-
-// "./MorvaneLogs/Morvane.log: " and the system's text for `error`.
-std::string logFailure(int error);

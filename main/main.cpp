@@ -3,6 +3,7 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <exception>
 #include <new>
 #include <string>
@@ -80,12 +81,17 @@ void keepLog() noexcept {
     }
 }
 
-// Why the run could not go on, as one line. A log that could not take something is behind whatever came of
-// it.
-std::string failureLine(const char* message) {
-    std::string line = logError() != 0 ? logFailure(logError()) : message;
-    line.erase(line.find_last_not_of('\n') + 1);
-    return "morvane: " + line + "\n";
+// Says in one line of standard error why the run could not go on, without memory of its own. A log that could
+// not take something is behind whatever came of it.
+void tellFailure(const char* message) noexcept {
+    clearProgress();
+    keepLog();
+    if (logError() != 0) {
+        static_cast<void>(std::fprintf(stderr, "morvane: %s: %s\n", kLogFile, ErrnoText(logError()).text));
+    } else {
+        const int length = static_cast<int>(std::strcspn(message, "\n"));
+        static_cast<void>(std::fprintf(stderr, "morvane: %.*s\n", length, message));
+    }
 }
 
 } // namespace
@@ -97,13 +103,9 @@ int main() {
         return EXIT_SUCCESS;
     } catch (const std::exception& exception) {
         // Nothing stands between this failure and the end of the program.
-        clearProgress();
-        keepLog();
-        static_cast<void>(std::fputs(failureLine(exception.what()).c_str(), stderr));
+        tellFailure(exception.what());
     } catch (...) {
-        clearProgress();
-        keepLog();
-        static_cast<void>(std::fputs("morvane: unknown exception\n", stderr));
+        tellFailure("unknown exception");
     }
     return EXIT_FAILURE;
 }
