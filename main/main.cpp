@@ -1,4 +1,5 @@
 // The entry: one linear run, from the log directory to the closing banner.
+#include <stdio_ext.h>
 #include <unistd.h>
 
 #include <cstdio>
@@ -68,7 +69,9 @@ void run() {
     completeLogFile(gLogStream);
     Clib_printf("Test completed.\n");
     if (std::fflush(stdout) != 0) {
-        throw WriteFailedEx((std::string("standard output: ") + ErrnoText().text).c_str());
+        const std::string reason = std::string("standard output: ") + ErrnoText().text;
+        __fpurge(stdout); // exit would try again, and might succeed
+        throw WriteFailedEx(reason.c_str());
     }
 }
 
@@ -77,7 +80,7 @@ void keepLog() noexcept {
     try {
         flushLog();
     } catch (const WriteFailedEx&) {
-        return; // told by failureLine
+        return; // told by tellFailure
     }
 }
 
