@@ -6,6 +6,9 @@ find_path(HBAAPI_INCLUDE_DIR hbaapi.h REQUIRED)
 if(CMAKE_SIZEOF_VOID_P EQUAL 4)
   set(HBAAPI_LIBRARY ${CMAKE_BINARY_DIR}/packages/libhbaapi2/usr/lib/libHBAAPI.so.2)
   set(CMAKE_BUILD_RPATH_USE_ORIGIN ON)
+  # CMake puts the separator of a run path's elements behind the last one, too, and the loader takes an empty element
+  # for the working directory. There is one element, a folder: a slash may stand behind it.
+  set(CMAKE_EXECUTABLE_RUNTIME_CXX_FLAG_SEP "/")
   if(NOT EXISTS ${HBAAPI_LIBRARY})
     message(FATAL_ERROR "No 32-bit libHBAAPI in ${CMAKE_BINARY_DIR}/packages/libhbaapi2: build with ./dev build i386")
   endif()

@@ -48,5 +48,11 @@ case $property in
         # The source folder, which is the third argument.
         ! grep -aqF "$3" "$program" || fail "holds the path $3"
         ;;
+    no_searched_working_directory)
+        # An element of the run path that is empty or relative is looked up from wherever the program is started.
+        path=$(sed -nE 's/.*\((RPATH|RUNPATH)\).*\[(.*)\]$/\2/p' <<<"$dynamic")
+        # shellcheck disable=SC2016 # $ORIGIN is the loader's
+        [ -z "$path" ] || ! tr ':' '\n' <<<"$path" | grep -qvE '^(/|\$ORIGIN(/|$))' || fail "run path: $path"
+        ;;
     *) fail "unknown property $property" ;;
 esac
