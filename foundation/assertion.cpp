@@ -1,5 +1,6 @@
 #include "foundation/assertion.hpp"
 
+#include <cstdio>
 #include <cstdlib>
 
 #include "foundation/exceptions.hpp"
@@ -10,7 +11,8 @@ void assertionFailed(const char* conditionText) {
     try {
         flushLog();
     } catch (const WriteFailedEx&) {
-        // the process ends here whether or not the log still takes the line
+        // The process ends here whether or not the log still takes the line.
+        static_cast<void>(std::fprintf(stderr, "Assertion [ %s ] failed\n", conditionText));
     }
     std::exit(1);
 }
