@@ -8,6 +8,7 @@
 #include <gtest/gtest.h>
 
 #include "foundation/exceptions.hpp"
+#include "tests/multipath/command_log.hpp"
 #include "tests/support/fake_commands.hpp"
 #include "tests/support/fatal.hpp"
 #include "tests/support/log_capture.hpp"
@@ -26,38 +27,12 @@ constexpr std::size_t kMostBytesOfARead = 3999;
 
 std::vector<useconds_t> gPauses; // as asked of usleep since the test's start
 
-std::vector<std::string> texts(const Handler::LineList::List& lines) {
-    std::vector<std::string> result;
-    for (const ZebString& line : lines) {
-        result.emplace_back(line.c_str());
-    }
-    return result;
-}
-
 Handler::LineList::List lineList(const std::vector<std::string>& texts) {
     Handler::LineList::List lines;
     for (const std::string& text : texts) {
         lines.emplace_back(text.c_str());
     }
     return lines;
-}
-
-// What a command leaves in the log that prints these lines, few enough for one read, `sum` being the lines
-// that the list then holds.
-std::string commandLog(const std::vector<std::string>& lines, std::size_t sum) {
-    std::string log = "Entered Function sExecuteCommand Line #\nCalling popen\n";
-    if (!lines.empty()) {
-        std::string output;
-        std::string cut;
-        for (const std::string& line : lines) {
-            output += line + "\n";
-            cut += "Line: " + line;
-        }
-        log += "Buffer got = " + output + "\nEntered Function sBreakOutput Line #\n" + cut +
-               "End of popened Buffer\nLeft Function sBreakOutput Line #\n";
-    }
-    return log + "Fread returned ERROR\nNumber of lines in output: " + std::to_string(sum) +
-           "\nLeft Function sExecuteCommand Line #\n";
 }
 
 const std::string kDaemonLog = "Checking if emcpd is running\n" + commandLog({"812 emcpd", "813 emcpd"}, 2) +

@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include "multipath/powerpath.hpp"
+#include "tests/multipath/command_log.hpp"
 #include "tests/support/log_capture.hpp"
 
 namespace {
@@ -13,32 +14,6 @@ using Handler = ZebSensorLinuxPowerPathHandler;
 
 constexpr const char* kDeviceListing =
     "/sbin/powermt display latency dev=all | grep -E '^Pseudo|^Logical' | sed 's/ \\[.*$//g'";
-
-std::vector<std::string> texts(const Handler::LineList::List& lines) {
-    std::vector<std::string> result;
-    for (const ZebString& line : lines) {
-        result.emplace_back(line.c_str());
-    }
-    return result;
-}
-
-// What a command leaves in the log that prints these lines, few enough for one read, `sum` being the lines
-// that the list then holds.
-std::string commandLog(const std::vector<std::string>& lines, std::size_t sum) {
-    std::string log = "Entered Function sExecuteCommand Line #\nCalling popen\n";
-    if (!lines.empty()) {
-        std::string output;
-        std::string cut;
-        for (const std::string& line : lines) {
-            output += line + "\n";
-            cut += "Line: " + line;
-        }
-        log += "Buffer got = " + output + "\nEntered Function sBreakOutput Line #\n" + cut +
-               "End of popened Buffer\nLeft Function sBreakOutput Line #\n";
-    }
-    return log + "Fread returned ERROR\nNumber of lines in output: " + std::to_string(sum) +
-           "\nLeft Function sExecuteCommand Line #\n";
-}
 
 TEST(PowerPathCommand, RunsInTheShell) {
     Handler::LineList::List lines;
