@@ -11,7 +11,7 @@ sources() {
 cmd_lint() {
     need "${run_packages[@]}" "${test_packages[@]}" "${lint_packages[@]}"
     cmake --preset debug -DMORVANE_TESTS=ON >/dev/null
-    cmake --build --preset debug -- --quiet view/view/page_template.hpp # a source includes it
+    cmake --build --preset debug -- --quiet view/view/show/page_template.hpp # a source includes it
     sources | xargs clang-format --dry-run --Werror
     sources | grep '\.cpp$' | xargs -P "$(nproc)" -n 4 clang-tidy --quiet -p build/debug 2>/dev/null
     shellcheck -x -a dev # with all it sources

@@ -15,13 +15,14 @@
 #include <CLI/CLI.hpp>
 #include <nlohmann/json.hpp>
 
-#include "view/diff.hpp"
-#include "view/escape.hpp"
-#include "view/html_page.hpp"
-#include "view/json_report.hpp"
-#include "view/log_reader.hpp"
-#include "view/san.hpp"
-#include "view/text_report.hpp"
+#include "view/model/diff.hpp"
+#include "view/model/san.hpp"
+#include "view/read/log_reader.hpp"
+#include "view/show/escape.hpp"
+#include "view/show/html_page.hpp"
+#include "view/show/json.hpp"
+#include "view/show/text.hpp"
+#include "view/show/warnings.hpp"
 
 namespace {
 
@@ -68,7 +69,7 @@ view::Model openLog(const std::string& path) {
 }
 
 void warnOf(const view::Model& model) {
-    for (const std::string& warning : view::logWarnings(model.log)) {
+    for (const std::string& warning : view::warningsOf(model.log)) {
         std::cerr << "morvane-view: warning: " << model.log.name << ": " << warning << '\n';
     }
 }

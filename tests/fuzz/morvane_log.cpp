@@ -7,13 +7,13 @@
 #include <vector>
 
 #include "tests/fuzz/input.hpp"
-#include "view/diff.hpp"
-#include "view/escape.hpp"
-#include "view/html_page.hpp"
-#include "view/json_report.hpp"
-#include "view/log_reader.hpp"
-#include "view/san.hpp"
-#include "view/text_report.hpp"
+#include "view/model/diff.hpp"
+#include "view/model/san.hpp"
+#include "view/read/log_reader.hpp"
+#include "view/show/escape.hpp"
+#include "view/show/html_page.hpp"
+#include "view/show/json.hpp"
+#include "view/show/text.hpp"
 
 namespace {
 

@@ -1,4 +1,4 @@
-#include "view/log_reader.hpp"
+#include "view/read/log_reader.hpp"
 
 #include <algorithm>
 #include <sstream>

@@ -1,4 +1,4 @@
-#include "view/luns.hpp"
+#include "view/model/luns.hpp"
 
 #include <string>
 #include <vector>

@@ -1,4 +1,4 @@
-#include "view/model_builder.hpp"
+#include "view/read/model_builder.hpp"
 
 #include <string>
 #include <vector>

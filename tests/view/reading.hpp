@@ -4,8 +4,8 @@
 #include <string>
 #include <string_view>
 
-#include "view/json_report.hpp"
-#include "view/log_reader.hpp"
+#include "view/read/log_reader.hpp"
+#include "view/show/json.hpp"
 
 // The text with which a run begins and the rules that begin and end a section, as the log has them.
 inline const std::string rule = "================================================\n";

@@ -1,9 +1,9 @@
-#include "view/text_report.hpp"
-
 #include <sstream>
 #include <string>
 
 #include <gtest/gtest.h>
+
+#include "view/show/text.hpp"
 
 namespace {
 

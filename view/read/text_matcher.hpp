@@ -6,7 +6,7 @@
 #include <string_view>
 #include <vector>
 
-#include "view/known_texts.hpp"
+#include "view/read/known_texts.hpp"
 
 namespace view {
 

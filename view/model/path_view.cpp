@@ -1,4 +1,4 @@
-#include "view/path_view.hpp"
+#include "view/model/path_view.hpp"
 
 namespace view {
 

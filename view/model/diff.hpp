@@ -1,16 +1,13 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 #include <optional>
-#include <ostream>
 #include <string>
 #include <vector>
 
-#include <nlohmann/json.hpp>
-
-#include "view/model.hpp"
-#include "view/path_view.hpp"
-#include "view/text_layout.hpp"
+#include "view/model/model.hpp"
+#include "view/model/path_view.hpp"
 
 namespace view {
 
@@ -44,17 +41,28 @@ struct DeviceDifference {
     std::string identifier; // empty when it has none of its own
 };
 
+// Why two logs may not compare well.
+struct DiffWarning {
+    enum class Kind : unsigned char { TwoHosts, NotWhole, TreeEnded, UnknownPieces };
+    Kind kind = Kind::TwoHosts;
+    bool isOfNewLog = false;  // what is odd is the new log, not the old one; of TwoHosts, neither
+    Tree tree = Tree::Run;    // of TreeEnded
+    std::uint64_t pieces = 0; // of UnknownPieces
+};
+
 // How two runs on one host differ. A device that only got another name is no difference.
 struct Difference {
-    std::vector<std::string> warnings; // why the logs may not compare well
+    std::string hostBefore; // empty when its log does not name it
+    std::string hostAfter;
+    std::vector<DiffWarning> warnings;
     std::vector<IdentityChange> identityChanges;
     std::vector<PathDifference> lostPaths;
     std::vector<PathDifference> newPaths;
     std::vector<PathCountChange> pathCounts; // of LUNs that have more or fewer paths, none included
     std::vector<DeviceDifference> lostDirect;
     std::vector<DeviceDifference> newDirect;
-    std::vector<std::string> lostLogical;
-    std::vector<std::string> newLogical;
+    std::vector<DeviceDifference> lostLogical; // without identifiers
+    std::vector<DeviceDifference> newLogical;
     std::optional<PowerPathState> powerPathBefore; // both set when they differ
     std::optional<PowerPathState> powerPathAfter;
 
@@ -62,10 +70,5 @@ struct Difference {
 };
 
 Difference compare(const Model& before, const Model& after);
-
-void writeText(std::ostream& output, const Difference& difference, const Style& style);
-
-// A JSON document of kind "diff".
-nlohmann::ordered_json toJson(const Difference& difference);
 
 } // namespace view

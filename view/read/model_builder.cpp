@@ -1,10 +1,8 @@
-#include "view/model_builder.hpp"
+#include "view/read/model_builder.hpp"
 
 #include <charconv>
 #include <limits>
 #include <system_error>
-
-#include "view/words.hpp"
 
 namespace view {
 

@@ -1,4 +1,4 @@
-#include "view/text_layout.hpp"
+#include "view/show/text_layout.hpp"
 
 #include <algorithm>
 #include <cstddef>

@@ -1,11 +1,11 @@
-#include "view/log_reader.hpp"
+#include "view/read/log_reader.hpp"
 
 #include <algorithm>
 #include <array>
 #include <utility>
 #include <vector>
 
-#include "view/luns.hpp"
+#include "view/model/luns.hpp"
 
 namespace view {
 

@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 // What a log says. Texts that came from devices or commands are kept byte for byte; escape.hpp makes them fit
@@ -11,6 +12,9 @@
 namespace view {
 
 enum class Tree : unsigned char { Run, Multipath, Fc, Iscsi, Direct, Logical };
+
+// The section of the log that reports a tree, as the log's banners call it.
+std::string_view section(Tree tree);
 
 enum class Severity : unsigned char {
     Problem, // something is missing from the report that should be there, or is wrong in it
@@ -234,5 +238,8 @@ struct Model {
     std::vector<Lun> luns;         // in the order of their first sighting
     std::vector<Problem> problems; // those of severity Problem first
 };
+
+// The number of a report's problems, notes left out.
+std::size_t problemCount(const Model& model);
 
 } // namespace view

@@ -1,10 +1,10 @@
-#include "view/json_report.hpp"
-
 #include <string>
 #include <vector>
 
-#include "view/escape.hpp"
-#include "view/words.hpp"
+#include "view/show/escape.hpp"
+#include "view/show/json.hpp"
+#include "view/show/json_values.hpp"
+#include "view/show/words.hpp"
 
 namespace view {
 
@@ -15,10 +15,6 @@ using Json = nlohmann::ordered_json;
 template <typename Value>
 Json orNull(const std::optional<Value>& value) {
     return value ? Json(*value) : Json();
-}
-
-Json textOrNull(const std::string& text) {
-    return text.empty() ? Json() : Json(printable(text));
 }
 
 Json identifierJson(const Identifier& identifier) {
@@ -32,14 +28,6 @@ Json factsJson(const DeviceFacts& facts) {
             {"product", textOrNull(facts.product)},
             {"revision", textOrNull(facts.revision)},
             {"pseudoDevice", textOrNull(facts.pseudoDevice)}};
-}
-
-Json texts(const std::vector<std::string>& list) {
-    Json json = Json::array();
-    for (const std::string& text : list) {
-        json.push_back(printable(text));
-    }
-    return json;
 }
 
 Json logJson(const LogFacts& log) {

@@ -1,15 +1,11 @@
 #pragma once
 
 #include <cstddef>
-#include <ostream>
 #include <string>
 #include <utility>
 #include <vector>
 
-#include <nlohmann/json.hpp>
-
-#include "view/model.hpp"
-#include "view/text_layout.hpp"
+#include "view/model/model.hpp"
 
 namespace view {
 
@@ -29,12 +25,7 @@ struct San {
     std::vector<SanLun> luns;       // in the order of their identifiers
 };
 
-// Joins the reports, which must outlive the result.
+// Joins the LUNs of the reports, which must outlive the result.
 San join(const std::vector<Model>& reports);
-
-void writeText(std::ostream& output, const San& san, const Style& style);
-
-// A JSON document of kind "san", without the reports themselves.
-nlohmann::ordered_json toJson(const San& san);
 
 } // namespace view

@@ -1,4 +1,4 @@
-#include "view/text_matcher.hpp"
+#include "view/read/text_matcher.hpp"
 
 #include <algorithm>
 

@@ -6,9 +6,9 @@
 #include <string>
 #include <string_view>
 
-#include "view/model.hpp"
-#include "view/model_builder.hpp"
-#include "view/text_matcher.hpp"
+#include "view/model/model.hpp"
+#include "view/read/model_builder.hpp"
+#include "view/read/text_matcher.hpp"
 
 namespace view {
 

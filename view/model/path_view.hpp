@@ -2,7 +2,7 @@
 
 #include <string>
 
-#include "view/model.hpp"
+#include "view/model/model.hpp"
 
 namespace view {
 

@@ -4,7 +4,7 @@
 #include <string>
 #include <string_view>
 
-#include "view/model.hpp"
+#include "view/model/model.hpp"
 
 namespace view {
 
@@ -17,10 +17,10 @@ std::string_view name(Severity severity);
 std::string_view name(ProblemKind kind);
 std::string_view name(IdentifierKind kind);
 
-// The section of the log that reports a tree, as the log's banners call it.
-std::string_view section(Tree tree);
-
 // "1 path", "2 paths".
 std::string counted(std::uint64_t count, std::string_view one);
+
+// The identifier, fit to be shown, or words for an empty one.
+std::string identifierWords(const Identifier& identifier);
 
 } // namespace view

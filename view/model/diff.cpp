@@ -1,4 +1,4 @@
-#include "view/diff.hpp"
+#include "view/model/diff.hpp"
 
 #include <algorithm>
 #include <iterator>
@@ -9,14 +9,9 @@
 #include <unordered_set>
 #include <utility>
 
-#include "view/escape.hpp"
-#include "view/words.hpp"
-
 namespace view {
 
 namespace {
-
-using Json = nlohmann::ordered_json;
 
 struct ListedPath {
     PathView view;
@@ -248,104 +243,28 @@ void compareLogical(Difference& difference, const Model& before, const Model& af
     subtract(old, now, lost);
     subtract(now, old, added);
     cancelUnplaced(lost, added);
-    const auto device = [](const LogicalDevice& logical) { return logical.device; };
+    const auto device = [](const LogicalDevice& logical) { return DeviceDifference{logical.device, {}}; };
     std::transform(lost.begin(), lost.end(), std::back_inserter(difference.lostLogical), device);
     std::transform(added.begin(), added.end(), std::back_inserter(difference.newLogical), device);
 }
 
-void addWarnings(Difference& difference, const Model& model, std::string_view which) {
-    if (!model.log.complete) {
-        difference.warnings.push_back(std::string(which) +
-                                      " log is not whole: what it does not reach counts as lost");
-    }
-    const auto ended = [&](TreeState state, Tree tree) {
-        if (state == TreeState::Ended) {
-            difference.warnings.push_back(std::string(which) + " log's " + std::string(section(tree)) +
-                                          " tree was ended early: what it does not list counts as lost");
-        }
+void addWarnings(Difference& difference, const Model& model, bool isOfNewLog) {
+    const auto warn = [&](DiffWarning::Kind kind, Tree tree = Tree::Run, std::uint64_t pieces = 0) {
+        difference.warnings.push_back({kind, isOfNewLog, tree, pieces});
     };
-    ended(model.fc.state, Tree::Fc);
-    ended(model.direct.state, Tree::Direct);
-    ended(model.logical.state, Tree::Logical);
+    if (!model.log.complete) {
+        warn(DiffWarning::Kind::NotWhole);
+    }
+    for (const auto& [tree, state] :
+         {std::pair(Tree::Fc, model.fc.state), std::pair(Tree::Direct, model.direct.state),
+          std::pair(Tree::Logical, model.logical.state)}) {
+        if (state == TreeState::Ended) {
+            warn(DiffWarning::Kind::TreeEnded, tree);
+        }
+    }
     if (model.log.unknownPieces > 0) {
-        difference.warnings.push_back(std::string(which) + " log holds " +
-                                      counted(model.log.unknownPieces, "piece") +
-                                      " that are none of Morvane's texts");
+        warn(DiffWarning::Kind::UnknownPieces, Tree::Run, model.log.unknownPieces);
     }
-}
-
-std::string placeWords(const PathView& path) {
-    return printable(path.initiator) + " -> " + printable(path.target) + " LUN " + path.lun;
-}
-
-void writePaths(std::ostream& output, const Style& style, std::string_view heading,
-                const std::vector<PathDifference>& paths, std::string_view unlistedWords) {
-    if (paths.empty()) {
-        return;
-    }
-    writeHeading(output, style, std::string(heading) + " (" + std::to_string(paths.size()) + ")");
-    Columns columns;
-    for (const PathDifference& difference : paths) {
-        columns.add({placeWords(difference.path), printable(difference.path.device),
-                     printable(difference.identifier),
-                     difference.isKnownUnlisted ? std::string(unlistedWords) : ""});
-    }
-    columns.write(output, "  ");
-}
-
-void writeList(std::ostream& output, const Style& style, std::string_view heading,
-               const std::vector<DeviceDifference>& devices) {
-    if (devices.empty()) {
-        return;
-    }
-    writeHeading(output, style, std::string(heading) + " (" + std::to_string(devices.size()) + ")");
-    Columns columns;
-    for (const DeviceDifference& difference : devices) {
-        columns.add({printable(difference.device), printable(difference.identifier)});
-    }
-    columns.write(output, "  ");
-}
-
-std::vector<DeviceDifference> named(const std::vector<std::string>& devices) {
-    std::vector<DeviceDifference> list;
-    list.reserve(devices.size());
-    for (const std::string& device : devices) {
-        list.push_back({device, {}});
-    }
-    return list;
-}
-
-Json pathJson(const PathView& path) {
-    return {{"tree", name(path.tree)},
-            {"initiator", printable(path.initiator)},
-            {"target", printable(path.target)},
-            {"lun", printable(path.lun)},
-            {"device", printable(path.device)}};
-}
-
-Json identifierJson(const std::optional<std::string>& identifier) {
-    return identifier ? Json(printable(*identifier)) : Json();
-}
-
-Json pathsJson(const std::vector<PathDifference>& paths) {
-    Json list = Json::array();
-    for (const PathDifference& difference : paths) {
-        Json json = pathJson(difference.path);
-        json["identifier"] = difference.identifier.empty() ? Json() : Json(printable(difference.identifier));
-        json["knownUnlisted"] = difference.isKnownUnlisted;
-        list.push_back(std::move(json));
-    }
-    return list;
-}
-
-Json devicesJson(const std::vector<DeviceDifference>& devices) {
-    Json list = Json::array();
-    for (const DeviceDifference& difference : devices) {
-        list.push_back({{"device", printable(difference.device)},
-                        {"identifier",
-                         difference.identifier.empty() ? Json() : Json(printable(difference.identifier))}});
-    }
-    return list;
 }
 
 } // namespace
@@ -358,12 +277,13 @@ bool Difference::isEmpty() const {
 
 Difference compare(const Model& before, const Model& after) {
     Difference difference;
+    difference.hostBefore = before.host;
+    difference.hostAfter = after.host;
     if (!before.host.empty() && !after.host.empty() && before.host != after.host) {
-        difference.warnings.push_back("the logs are of two hosts: " + printable(before.host) + " and " +
-                                      printable(after.host));
+        difference.warnings.emplace_back();
     }
-    addWarnings(difference, before, "the old");
-    addWarnings(difference, after, "the new");
+    addWarnings(difference, before, false);
+    addWarnings(difference, after, true);
     comparePaths(difference, before, after);
     compareCounts(difference, before, after);
     const ByKey<DeviceDifference> directBefore = directByKey(before);
@@ -378,113 +298,6 @@ Difference compare(const Model& before, const Model& after) {
         difference.powerPathAfter = after.multipath.state;
     }
     return difference;
-}
-
-void writeText(std::ostream& output, const Difference& difference, const Style& style) {
-    for (const std::string& warning : difference.warnings) {
-        output << "warning: " << warning << '\n';
-    }
-    if (difference.isEmpty()) {
-        output << style.good << "No difference." << style.end << '\n';
-        return;
-    }
-    const auto dangerous = std::count_if(difference.identityChanges.begin(), difference.identityChanges.end(),
-                                         [](const IdentityChange& change) { return change.isDangerous(); });
-    if (dangerous > 0) {
-        output << '\n'
-               << style.problem << "DANGER: another LUN behind the same initiator, target and LUN number ("
-               << dangerous << ')' << style.end << '\n';
-        for (const IdentityChange& change : difference.identityChanges) {
-            if (change.isDangerous()) {
-                output << "  " << placeWords(change.path) << "  " << printable(change.path.device)
-                       << "\n    was " << printable(*change.before) << "\n    is  "
-                       << printable(*change.after) << '\n';
-            }
-        }
-    }
-    if (static_cast<std::size_t>(dangerous) < difference.identityChanges.size()) {
-        writeHeading(
-            output, style,
-            "Identifier readable in one log only (" +
-                std::to_string(difference.identityChanges.size() - static_cast<std::size_t>(dangerous)) +
-                ")");
-        for (const IdentityChange& change : difference.identityChanges) {
-            if (!change.isDangerous()) {
-                output << "  " << placeWords(change.path) << "  " << printable(change.path.device)
-                       << (change.before ? "  can no longer be read, was " : "  can be read now: ")
-                       << printable(change.before ? *change.before : change.after.value_or("")) << '\n';
-            }
-        }
-    }
-    writePaths(output, style, "Lost paths", difference.lostPaths,
-               "the new log identified such a device without listing it");
-    writePaths(output, style, "New paths", difference.newPaths,
-               "the old log identified such a device without listing it");
-    if (!difference.pathCounts.empty()) {
-        writeHeading(output, style,
-                     "LUNs with another number of paths (" + std::to_string(difference.pathCounts.size()) +
-                         ")");
-        Columns columns;
-        for (const PathCountChange& change : difference.pathCounts) {
-            std::string verdict = change.after < change.before ? "fewer" : "more";
-            if (change.after == 0) {
-                verdict = "gone";
-            } else if (change.before == 0) {
-                verdict = "new";
-            }
-            columns.add({verdict, std::to_string(change.before) + " -> " + std::to_string(change.after),
-                         printable(change.identifier), printable(change.facts.vendor),
-                         printable(change.facts.product)});
-        }
-        columns.write(output, "  ");
-    }
-    writeList(output, style, "Lost direct disks", difference.lostDirect);
-    writeList(output, style, "New direct disks", difference.newDirect);
-    writeList(output, style, "Lost logical devices", named(difference.lostLogical));
-    writeList(output, style, "New logical devices", named(difference.newLogical));
-    if (difference.powerPathBefore && difference.powerPathAfter) {
-        writeHeading(output, style,
-                     "PowerPath was " + std::string(name(*difference.powerPathBefore)) + ", is " +
-                         std::string(name(*difference.powerPathAfter)));
-    }
-}
-
-nlohmann::ordered_json toJson(const Difference& difference) {
-    Json changes = Json::array();
-    for (const IdentityChange& change : difference.identityChanges) {
-        Json json = pathJson(change.path);
-        json["before"] = identifierJson(change.before);
-        json["after"] = identifierJson(change.after);
-        json["dangerous"] = change.isDangerous();
-        changes.push_back(std::move(json));
-    }
-    Json counts = Json::array();
-    for (const PathCountChange& change : difference.pathCounts) {
-        counts.push_back({{"identifier", printable(change.identifier)},
-                          {"before", change.before},
-                          {"after", change.after}});
-    }
-    Json warnings = Json::array();
-    for (const std::string& warning : difference.warnings) {
-        warnings.push_back(warning);
-    }
-    Json powerPath;
-    if (difference.powerPathBefore && difference.powerPathAfter) {
-        powerPath = {{"before", name(*difference.powerPathBefore)},
-                     {"after", name(*difference.powerPathAfter)}};
-    }
-    return {{"kind", "diff"},
-            {"same", difference.isEmpty()},
-            {"warnings", warnings},
-            {"identityChanges", std::move(changes)},
-            {"lostPaths", pathsJson(difference.lostPaths)},
-            {"newPaths", pathsJson(difference.newPaths)},
-            {"pathCounts", std::move(counts)},
-            {"lostDirect", devicesJson(difference.lostDirect)},
-            {"newDirect", devicesJson(difference.newDirect)},
-            {"lostLogical", devicesJson(named(difference.lostLogical))},
-            {"newLogical", devicesJson(named(difference.newLogical))},
-            {"powerPath", powerPath}};
 }
 
 } // namespace view

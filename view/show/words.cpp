@@ -1,6 +1,8 @@
-#include "view/words.hpp"
+#include "view/show/words.hpp"
 
 #include <array>
+
+#include "view/show/escape.hpp"
 
 namespace view {
 
@@ -70,14 +72,12 @@ std::string_view name(IdentifierKind kind) {
     return pick(names, kind);
 }
 
-std::string_view section(Tree tree) {
-    static constexpr std::array<std::string_view, 6> names = {"run",   "multipath", "FC",
-                                                              "ISCSI", "DAS",       "LOGICAL"};
-    return pick(names, tree);
-}
-
 std::string counted(std::uint64_t count, std::string_view one) {
     return std::to_string(count) + " " + std::string(one) + (count == 1 ? "" : "s");
+}
+
+std::string identifierWords(const Identifier& identifier) {
+    return identifier.text.empty() ? "(empty)" : printable(identifier.text);
 }
 
 } // namespace view

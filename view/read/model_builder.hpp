@@ -9,8 +9,8 @@
 #include <utility>
 #include <vector>
 
-#include "view/model.hpp"
-#include "view/text_matcher.hpp"
+#include "view/model/model.hpp"
+#include "view/read/text_matcher.hpp"
 
 namespace view {
 

@@ -1,4 +1,4 @@
-#include "view/escape.hpp"
+#include "view/show/escape.hpp"
 
 #include <cstddef>
 #include <cstdint>

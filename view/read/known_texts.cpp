@@ -1,4 +1,4 @@
-#include "view/known_texts.hpp"
+#include "view/read/known_texts.hpp"
 
 #include <array>
 

@@ -1,8 +1,8 @@
-#include "view/html_page.hpp"
+#include "view/show/html_page.hpp"
 
 #include <string_view>
 
-#include "view/page_template.hpp"
+#include "view/show/page_template.hpp"
 
 namespace view {
 

@@ -1,16 +1,15 @@
-#include "view/text_report.hpp"
-
 #include <algorithm>
 #include <cstddef>
 #include <iomanip>
 #include <map>
-#include <sstream>
 #include <string_view>
 #include <utility>
 
-#include "view/escape.hpp"
-#include "view/path_view.hpp"
-#include "view/words.hpp"
+#include "view/model/path_view.hpp"
+#include "view/show/escape.hpp"
+#include "view/show/text.hpp"
+#include "view/show/warnings.hpp"
+#include "view/show/words.hpp"
 
 namespace view {
 
@@ -33,10 +32,7 @@ void writeTitle(std::ostream& output, const Model& model, const Style& style) {
 }
 
 void writeProblems(std::ostream& output, const Model& model, const Style& style) {
-    const auto firstNote =
-        std::find_if(model.problems.begin(), model.problems.end(),
-                     [](const Problem& problem) { return problem.severity == Severity::Note; });
-    const auto problems = static_cast<std::size_t>(firstNote - model.problems.begin());
+    const std::size_t problems = problemCount(model);
     if (problems == 0) {
         output << '\n' << style.good << "No problems." << style.end << '\n';
     }
@@ -59,7 +55,7 @@ void writeProblems(std::ostream& output, const Model& model, const Style& style)
 }
 
 void writeWarnings(std::ostream& output, const LogFacts& log, const Style& style) {
-    const std::vector<std::string> warnings = logWarnings(log);
+    const std::vector<std::string> warnings = warningsOf(log);
     if (warnings.empty()) {
         return;
     }
@@ -75,10 +71,8 @@ void writeLuns(std::ostream& output, const Model& model, const Style& style) {
     }
     writeHeading(output, style, "LUNs (" + std::to_string(model.luns.size()) + ")");
     for (const Lun& lun : model.luns) {
-        const std::string identifier =
-            lun.identifier.text.empty() ? "(empty)" : printable(lun.identifier.text);
         const std::string product = joinWords({printable(lun.facts.vendor), printable(lun.facts.product)});
-        output << "  " << style.heading << identifier << style.end << "  "
+        output << "  " << style.heading << identifierWords(lun.identifier) << style.end << "  "
                << counted(lun.devices.size(), "path");
         if (!product.empty()) {
             output << "  " << product;
@@ -242,37 +236,6 @@ void writeMultipath(std::ostream& output, const Model& model, const Style& style
 }
 
 } // namespace
-
-std::vector<std::string> logWarnings(const LogFacts& log) {
-    std::vector<std::string> warnings;
-    if (log.runs > 1) {
-        warnings.push_back("it holds " + counted(log.runs, "run") + "; the last one is shown");
-    }
-    if (log.beginsInside) {
-        warnings.emplace_back("its beginning is missing");
-    }
-    if (log.leftoverTexts > 0) {
-        warnings.push_back(
-            counted(log.leftoverTexts, "text") +
-            " before the first run or behind the end of the last one left out: an older run's");
-    }
-    if (log.cutInLine) {
-        warnings.emplace_back("its last line has no end");
-    }
-    if (log.unknownPieces > 0) {
-        std::ostringstream warning;
-        warning << counted(log.unknownPieces, "piece") << (log.unknownPieces == 1 ? " is" : " are")
-                << " none of Morvane's texts:";
-        for (const UnknownPiece& piece : log.unknownSamples) {
-            warning << "\n    line " << piece.line << ": " << printable(piece.bytes);
-        }
-        if (log.unknownPieces > log.unknownSamples.size()) {
-            warning << "\n    and " << log.unknownPieces - log.unknownSamples.size() << " more";
-        }
-        warnings.push_back(warning.str());
-    }
-    return warnings;
-}
 
 void writeText(std::ostream& output, const Model& model, const Style& style) {
     writeTitle(output, model, style);

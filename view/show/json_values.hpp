@@ -1,0 +1,16 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include <nlohmann/json.hpp>
+
+namespace view {
+
+// A text from the log as a JSON string, fit to be shown; null for an empty one.
+nlohmann::ordered_json textOrNull(const std::string& text);
+
+// Texts from the log as a list, each fit to be shown.
+nlohmann::ordered_json texts(const std::vector<std::string>& list);
+
+} // namespace view
