@@ -26,9 +26,9 @@
 
 namespace {
 
-constexpr int exitSame = 0;
-constexpr int exitDifferent = 1;
-constexpr int exitTrouble = 2;
+constexpr int kExitSame = 0;
+constexpr int kExitDifferent = 1;
+constexpr int kExitTrouble = 2;
 
 // What stops the program, in a sentence for its user.
 class Trouble : public std::runtime_error {
@@ -126,7 +126,7 @@ int report(const Options& options) {
     } else {
         view::writeText(std::cout, model, outputStyle());
     }
-    return exitSame;
+    return kExitSame;
 }
 
 int diff(const Options& options) {
@@ -136,7 +136,7 @@ int diff(const Options& options) {
     } else {
         view::writeText(std::cout, difference, outputStyle());
     }
-    return difference.isEmpty() ? exitSame : exitDifferent;
+    return difference.isEmpty() ? kExitSame : kExitDifferent;
 }
 
 int san(const Options& options) {
@@ -163,10 +163,10 @@ int san(const Options& options) {
     } else if (options.page.empty()) {
         view::writeText(std::cout, joined, outputStyle());
     }
-    return exitSame;
+    return kExitSame;
 }
 
-constexpr const char* examples = R"(Examples:
+constexpr const char* kExamples = R"(Examples:
   morvane-view                               read ./MorvaneLogs/Morvane.log
   ssh db1 cat MorvaneLogs/Morvane.log | morvane-view -
   morvane-view --html paths.html Morvane.log
@@ -179,7 +179,7 @@ int run(int argc, char** argv) {
     CLI::App app{
         "Reads the logs of morvane: the storage paths of a host, what is wrong with them, what changed.",
         "morvane-view"};
-    app.footer(examples);
+    app.footer(kExamples);
     app.set_version_flag("--version", MORVANE_VERSION);
     app.add_option("LOG", options.log, "the log to read, - for standard input")->capture_default_str();
     app.add_flag("--json", options.json, "write JSON instead of text");
@@ -198,9 +198,9 @@ int run(int argc, char** argv) {
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
-        return app.exit(error) == 0 ? exitSame : exitTrouble;
+        return app.exit(error) == 0 ? kExitSame : kExitTrouble;
     }
-    int status = exitSame;
+    int status = kExitSame;
     if (*diffCommand) {
         status = diff(options);
     } else if (*sanCommand) {
@@ -224,5 +224,5 @@ int main(int argc, char** argv) {
     } catch (const std::exception& error) {
         std::cerr << "morvane-view: " << error.what() << '\n';
     }
-    return exitTrouble;
+    return kExitTrouble;
 }

@@ -66,7 +66,7 @@ def form(text):
 
 def compare_with_reader(root, quoted):
     """Prints what only the page or only the reader has; whether there is any."""
-    known = set(re.findall(rf"\{{Text::\w+,\s*({LITERAL})\}}", literals_of(root / "view/read/known_texts.cpp")))
+    known = set(re.findall(rf"\{{Text::\w+,\s*({LITERAL})[,}}]", literals_of(root / "view/read/known_texts.cpp")))
     on_page = {form(text): text for text in quoted - PIECES - VALUES}
     in_reader = {form(text): text for text in known - LINES - {QUOTE}}
     unknown = sorted(on_page[text] for text in on_page.keys() - in_reader.keys())

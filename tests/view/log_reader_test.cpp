@@ -96,7 +96,7 @@ TEST(LogReader, TakesTheLastTraceBehindUnknownBytes) {
 }
 
 TEST(LogReader, FollowsAFieldOverLineEnds) {
-    const Model model = modelOf(dasBanner + diskLine("/dev/sd\na", "\n6\n") + diskLine("/dev/sdb", "7"));
+    const Model model = modelOf(kDasBanner + diskLine("/dev/sd\na", "\n6\n") + diskLine("/dev/sdb", "7"));
     EXPECT_EQ(disksOf(model), (Disks{{"/dev/sd\na", "\n6\n"}, {"/dev/sdb", "7"}}));
     EXPECT_EQ(cut("Found T10 Id: AC\nME \nGot ULID\n"), (Cut{3, 2, 0}));
 }
@@ -123,7 +123,7 @@ TEST(LogReader, FollowsATextOver32LinesAtMost) {
 }
 
 TEST(LogReader, HoldsOnlyTheTextsThatMayGoOn) {
-    std::string log = dasBanner;
+    std::string log = kDasBanner;
     Disks disks;
     for (unsigned i = 0; i < 40; ++i) {
         log += "Found T10 Id: ACME\n" + diskLine("/dev/" + std::to_string(i), "6");
@@ -141,7 +141,7 @@ TEST(LogReader, TakesForeignLinesBehindOpenEndedTextForParts) {
 }
 
 TEST(LogReader, CountsUnknownPiecesAndKeepsTheFirstFive) {
-    const LogFacts facts = modelOf(runStart + unknownLines(7)).log;
+    const LogFacts facts = modelOf(kRunStart + unknownLines(7)).log;
     EXPECT_EQ(facts.unknownPieces, 7);
     EXPECT_EQ(facts.unknownBytes, 7 * std::string("unknown 1").size());
     std::vector<std::pair<std::uint64_t, std::string>> samples;
@@ -161,17 +161,17 @@ TEST(LogReader, KeepsTheFirst120BytesOfAnUnknownPiece) {
 }
 
 TEST(LogReader, ReadsALogThatIsCutInTheMiddleOfALine) {
-    const Model model = modelOf(runStart + dasBanner + diskLine("/dev/sda", "6") + "--------> Device Na");
+    const Model model = modelOf(kRunStart + kDasBanner + diskLine("/dev/sda", "6") + "--------> Device Na");
     EXPECT_EQ(disksOf(model), (Disks{{"/dev/sda", "6"}}));
     EXPECT_TRUE(model.log.cutInLine);
     EXPECT_EQ(model.log.lines, 4);
     EXPECT_EQ(model.log.unknownSamples.size(), 1);
-    EXPECT_FALSE(modelOf(runStart).log.cutInLine);
+    EXPECT_FALSE(modelOf(kRunStart).log.cutInLine);
 }
 
 TEST(LogReader, ReportsTheLastOfSeveralRuns) {
-    const std::string first = runStart + dasBanner + diskLine("/dev/sda", "6") + runEnd;
-    const std::string second = runStart + dasBanner + diskLine("/dev/sdb", "7") + runEnd;
+    const std::string first = kRunStart + kDasBanner + diskLine("/dev/sda", "6") + kRunEnd;
+    const std::string second = kRunStart + kDasBanner + diskLine("/dev/sdb", "7") + kRunEnd;
     const Model model = modelOf(first + second);
     EXPECT_EQ(disksOf(model), (Disks{{"/dev/sdb", "7"}}));
     EXPECT_EQ(model.log.runs, 2U);
@@ -180,7 +180,7 @@ TEST(LogReader, ReportsTheLastOfSeveralRuns) {
 }
 
 TEST(LogReader, LeavesOutAnOlderRunsTextsBehindTheEnd) {
-    const Model model = modelOf(runStart + dasBanner + diskLine("/dev/sda", "6") + runEnd + rule +
+    const Model model = modelOf(kRunStart + kDasBanner + diskLine("/dev/sda", "6") + kRunEnd + kRule +
                                 "Got ULID\n" + diskLine("/dev/sdb", "7") + diskLine("/dev/sdc", "8"));
     EXPECT_EQ(disksOf(model), (Disks{{"/dev/sda", "6"}}));
     EXPECT_TRUE(model.log.complete);
@@ -188,14 +188,15 @@ TEST(LogReader, LeavesOutAnOlderRunsTextsBehindTheEnd) {
 }
 
 TEST(LogReader, LeavesOutTextsBeforeTheFirstRun) {
-    const Model model = modelOf(diskLine("/dev/sda", "6") + runStart + dasBanner + diskLine("/dev/sdb", "7"));
+    const Model model =
+        modelOf(diskLine("/dev/sda", "6") + kRunStart + kDasBanner + diskLine("/dev/sdb", "7"));
     EXPECT_EQ(disksOf(model), (Disks{{"/dev/sdb", "7"}}));
     EXPECT_FALSE(model.log.beginsInside);
     EXPECT_EQ(model.log.leftoverTexts, 1);
 }
 
 TEST(LogReader, ReadsALogWhoseBeginningIsMissing) {
-    const Model model = modelOf(diskLine("/dev/sda", "6") + runEnd);
+    const Model model = modelOf(diskLine("/dev/sda", "6") + kRunEnd);
     EXPECT_EQ(disksOf(model), (Disks{{"/dev/sda", "6"}}));
     EXPECT_TRUE(model.log.beginsInside);
     EXPECT_TRUE(model.log.complete);
@@ -203,9 +204,9 @@ TEST(LogReader, ReadsALogWhoseBeginningIsMissing) {
 
 TEST(LogReader, SaysTheSameWhateverTheChunks) {
     const std::string log =
-        unknownLines(3) + runStart + "Line: aLine: bEntered Function f Line 1\nFound T10 Id: A\nB \n" +
-        "Buffer got = x\ny\nFound T10 Id: ACME\nGot ULID\n" + dasBanner + diskLine("/dev/sd\na", "\xff") +
-        diskLine("/dev/sdb", "7") + runEnd + "--------> Dev";
+        unknownLines(3) + kRunStart + "Line: aLine: bEntered Function f Line 1\nFound T10 Id: A\nB \n" +
+        "Buffer got = x\ny\nFound T10 Id: ACME\nGot ULID\n" + kDasBanner + diskLine("/dev/sd\na", "\xff") +
+        diskLine("/dev/sdb", "7") + kRunEnd + "--------> Dev";
     const std::string whole = view::toJson(modelOf(log)).dump();
     for (std::size_t chunk = 1; chunk < log.size(); ++chunk) {
         EXPECT_EQ(view::toJson(modelOf(log, chunk)).dump(), whole) << chunk;
@@ -226,8 +227,8 @@ TEST(LogReader, CutsALineBeyond16MiBAtOnePlaceWhateverTheChunks) {
 
 TEST(LogReader, NumbersTheLineWhereATextBegins) {
     const Model model =
-        modelOf(runStart + "Found T10 Id: A\n\nB \n--------> Device Name: |/dev/s\nr0| is not supported\n" +
-                "|ram0| is of no interest to us. Ignoring\n" + runEnd);
+        modelOf(kRunStart + "Found T10 Id: A\n\nB \n--------> Device Name: |/dev/s\nr0| is not supported\n" +
+                "|ram0| is of no interest to us. Ignoring\n" + kRunEnd);
     std::vector<std::uint64_t> lines;
     for (const view::Problem& problem : model.problems) {
         lines.push_back(problem.line);
@@ -236,7 +237,7 @@ TEST(LogReader, NumbersTheLineWhereATextBegins) {
 }
 
 TEST(LogReader, ReadsAStreamToItsEnd) {
-    std::istringstream input(runStart + runEnd);
+    std::istringstream input(kRunStart + kRunEnd);
     const Model model = view::readLog(input, "a name");
     EXPECT_EQ(model.log.name, "a name");
     EXPECT_EQ(model.log.bytes, input.str().size());

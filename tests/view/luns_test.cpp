@@ -55,9 +55,9 @@ using Lines = std::vector<std::string>;
 
 TEST(Luns, GroupPathsOfOneIdentifierWhateverTheTree) {
     const Model model =
-        modelOf(fcBanner + adapterLines("1") + pathLines("52:01", "/dev/sda", "6", "0") +
+        modelOf(kFcBanner + adapterLines("1") + pathLines("52:01", "/dev/sda", "6", "0") +
                 pathLines("52:02", "/dev/sdb", "7", "1") + pathLines("52:02", "/dev/sdc", "6", "0") +
-                iscsiBanner + iscsiLines("/dev/sdd", "7") + dasBanner + diskLine("/dev/sde", "6"));
+                kIscsiBanner + iscsiLines("/dev/sdd", "7") + kDasBanner + diskLine("/dev/sde", "6"));
     EXPECT_EQ(lunsOf(model),
               (Lines{"6: /dev/sda /dev/sdc /dev/sde, seen 3", "7: /dev/sdb /dev/sdd, seen 2"}));
     EXPECT_EQ(reasonsOf(model), (Lines{"", ""}));
@@ -65,28 +65,28 @@ TEST(Luns, GroupPathsOfOneIdentifierWhateverTheTree) {
 
 TEST(Luns, CountADeviceOnceThatIsListedBelowTwoPorts) {
     const std::string path = pathLines("52:01", "/dev/sda", "6", "0");
-    const Model model = modelOf(fcBanner + adapterLines("1") + path + "|  |_ Initiator wwpn 10:02\n" + path);
+    const Model model = modelOf(kFcBanner + adapterLines("1") + path + "|  |_ Initiator wwpn 10:02\n" + path);
     EXPECT_EQ(lunsOf(model), (Lines{"6: /dev/sda, seen 2"}));
 }
 
 TEST(Luns, HoldWhatTheTreeLeavesOut) {
     const Model model =
-        modelOf(fcBanner + "Going to open Adapter #0 - 'a'\nAdded to DevMap 1 --> /dev/sda --> 1\n"
-                           "UniqueLunid = 6 size = 1\nGoing to open Adapter #1 - 'b'\n");
+        modelOf(kFcBanner + "Going to open Adapter #0 - 'a'\nAdded to DevMap 1 --> /dev/sda --> 1\n"
+                            "UniqueLunid = 6 size = 1\nGoing to open Adapter #1 - 'b'\n");
     EXPECT_EQ(lunsOf(model), (Lines{"6: /dev/sda, seen 1"}));
     ASSERT_EQ(model.luns.size(), 1);
     EXPECT_EQ(model.luns[0].sightings[0].place, view::Sighting::Place::Unlisted);
 }
 
 TEST(Luns, LeaveOutWhatHasNoIdentifier) {
-    const Model model = modelOf(iscsiBanner + iscsiLines("/dev/sda", ":-( SCSI_Inquiry_Failed") + dasBanner +
-                                diskLine("/dev/sdb", "host::/dev/sdb"));
+    const Model model = modelOf(kIscsiBanner + iscsiLines("/dev/sda", ":-( SCSI_Inquiry_Failed") +
+                                kDasBanner + diskLine("/dev/sdb", "host::/dev/sdb"));
     EXPECT_EQ(lunsOf(model), Lines());
 }
 
 TEST(Luns, AreNotUniqueWithAnIdentifierThatTellsNothing) {
-    const Model model = modelOf(dasBanner + diskLine("/dev/sda", "") + diskLine("/dev/sdb", "00 0") +
-                                diskLine("/dev/sdc", "01") + runEnd);
+    const Model model = modelOf(kDasBanner + diskLine("/dev/sda", "") + diskLine("/dev/sdb", "00 0") +
+                                diskLine("/dev/sdc", "01") + kRunEnd);
     EXPECT_EQ(
         reasonsOf(model),
         (Lines{"an empty identifier is none",
@@ -102,24 +102,24 @@ TEST(Luns, AreNotUniqueWithAnIdentifierThatTellsNothing) {
 
 TEST(Luns, AreNotUniqueWithAnIdentifierAtSeveralNumbersOfOneTarget) {
     const std::string numbers = "several LUN numbers of one target carry it";
-    EXPECT_EQ(reasonsOf(modelOf(fcBanner + adapterLines("1") + pathLines("52:01", "/dev/sda", "6", "0") +
+    EXPECT_EQ(reasonsOf(modelOf(kFcBanner + adapterLines("1") + pathLines("52:01", "/dev/sda", "6", "0") +
                                 pathLines("52:01", "/dev/sdb", "6", "1"))),
               Lines{numbers});
-    EXPECT_EQ(
-        reasonsOf(modelOf(iscsiBanner + iscsiLines("/dev/sda", "6", "0") + iscsiLines("/dev/sdb", "6", "1"))),
-        Lines{numbers});
+    EXPECT_EQ(reasonsOf(modelOf(kIscsiBanner + iscsiLines("/dev/sda", "6", "0") +
+                                iscsiLines("/dev/sdb", "6", "1"))),
+              Lines{numbers});
 }
 
 TEST(Luns, AreUniqueWithOneNumberAtEachTarget) {
-    const Model model = modelOf(fcBanner + adapterLines("1") + pathLines("52:01", "/dev/sda", "6", "0") +
+    const Model model = modelOf(kFcBanner + adapterLines("1") + pathLines("52:01", "/dev/sda", "6", "0") +
                                 pathLines("52:02", "/dev/sdb", "6", "1"));
     EXPECT_EQ(reasonsOf(model), Lines{""});
 }
 
 TEST(Luns, PutProblemsBeforeNotes) {
     const Model model =
-        modelOf(dasBanner + "|ram0| is of no interest to us. Ignoring\n" + diskLine("/dev/sda", "0") +
-                "|ram1| is of no interest to us. Ignoring\n" + runEnd);
+        modelOf(kDasBanner + "|ram0| is of no interest to us. Ignoring\n" + diskLine("/dev/sda", "0") +
+                "|ram1| is of no interest to us. Ignoring\n" + kRunEnd);
     std::vector<std::string> subjects;
     for (const view::Problem& problem : model.problems) {
         subjects.push_back(problem.subject);

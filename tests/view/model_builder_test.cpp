@@ -44,15 +44,15 @@ Lines problemsOf(const Model& model) {
 
 // The problems of a run whose texts are `texts`; line 1 is its beginning.
 Lines problemsOfRun(const std::string& texts) {
-    return problemsOf(modelOf(runStart + texts + runEnd));
+    return problemsOf(modelOf(kRunStart + texts + kRunEnd));
 }
 
 TEST(ModelBuilder, JoinsThePartsOfAnFcPath) {
     const Model model = modelOf(
-        fcBanner + kOpening + "Adapter info: Manufacturer ACME Model A 8 NumPorts=1\n" +
+        kFcBanner + kOpening + "Adapter info: Manufacturer ACME Model A 8 NumPorts=1\n" +
         "The number of targets is 1\nVendor DISKCO ProductId ARRAY 9 ProductRev 1.0\n" +
         identified("/dev/sdb", "6") + "Pseudo Device for Unique LunId 6 is emcpowera\n" + kAdapterLines +
-        kTargetLine + lunLine("/dev/sdb", "6") + "Time taken to build tree: 12.50 milliseconds\n" + runEnd);
+        kTargetLine + lunLine("/dev/sdb", "6") + "Time taken to build tree: 12.50 milliseconds\n" + kRunEnd);
     EXPECT_EQ(
         sectionOf(model, "fc"),
         R"({"state":"built","loadMilliseconds":null,"buildMilliseconds":12.5,"adapters":[{"number":0,)"
@@ -66,7 +66,7 @@ TEST(ModelBuilder, JoinsThePartsOfAnFcPath) {
 
 TEST(ModelBuilder, ReadsAnFcTreeWhoseProgressIsMissing) {
     const Model model = modelOf(kAdapterLines + kTargetLine + lunLine("/dev/sdb", "6") + kAdapterLines +
-                                kTargetLine + lunLine("/dev/sdc", "7") + runEnd);
+                                kTargetLine + lunLine("/dev/sdc", "7") + kRunEnd);
     ASSERT_EQ(model.fc.paths.size(), 2);
     EXPECT_EQ(model.fc.adapters.size(), 2);
     EXPECT_EQ(model.fc.paths[1].adapter, 1);
@@ -75,8 +75,8 @@ TEST(ModelBuilder, ReadsAnFcTreeWhoseProgressIsMissing) {
 
 TEST(ModelBuilder, TakesAnEmptySlotForNoPathAndTheLunThatItDisplacedForUnlisted) {
     const Model model =
-        modelOf(runStart + fcBanner + kOpening + identified("/dev/sdb", "6") + identified("/dev/sdc", "7") +
-                kAdapterLines + kTargetLine + lunLine("", "", "0") + lunLine("/dev/sdb", "6") + runEnd);
+        modelOf(kRunStart + kFcBanner + kOpening + identified("/dev/sdb", "6") + identified("/dev/sdc", "7") +
+                kAdapterLines + kTargetLine + lunLine("", "", "0") + lunLine("/dev/sdb", "6") + kRunEnd);
     ASSERT_EQ(model.fc.paths.size(), 1);
     EXPECT_EQ(model.fc.paths[0].device, "/dev/sdb");
     ASSERT_EQ(model.fc.adapters.size(), 1);
@@ -91,7 +91,7 @@ TEST(ModelBuilder, TakesAnEmptySlotForNoPathAndTheLunThatItDisplacedForUnlisted)
 
 TEST(ModelBuilder, TellsWhichLunWasDroppedAndWhy) {
     EXPECT_EQ(
-        problemsOfRun(fcBanner + kOpening +
+        problemsOfRun(kFcBanner + kOpening +
                       "Failed in getting the VendorId for device /dev/sdb Lun 5 Under Target 52:01 ignoring\n"
                       "Entered Function HA_GetScsiUniqueLunId Line 1\nGet LunID\nTimeout\n"
                       "Time-out in Reading VPD 0x83 Page\nioctl failed, error code = 5\n"
@@ -103,7 +103,7 @@ TEST(ModelBuilder, TellsWhichLunWasDroppedAndWhy) {
 }
 
 TEST(ModelBuilder, TellsAtMostFourCauses) {
-    std::string texts = fcBanner + kOpening;
+    std::string texts = kFcBanner + kOpening;
     for (unsigned i = 0; i < 9; ++i) {
         texts += "GotStatus:Category=2; Code=" + std::to_string(i) + ";\nSCSI Error for VPD 0x83 Inquiry\n";
     }
@@ -116,14 +116,14 @@ TEST(ModelBuilder, TellsAtMostFourCauses) {
 TEST(ModelBuilder, NotesALunWithoutADeviceOnceForBothPasses) {
     const std::string unnamed = "Device Name Unassigned for Lun 5 under Target 52:01 ignoring\n";
     EXPECT_EQ(
-        problemsOfRun(fcBanner + kOpening + unnamed + unnamed),
+        problemsOfRun(kFcBanner + kOpening + unnamed + unnamed),
         Lines{
             "problem, fc, LUN 5: dropped: target 52:01 offers it, but the host has no device for it, line 4"});
 }
 
 TEST(ModelBuilder, TellsWhyAnAdapterIsMissing) {
     EXPECT_EQ(
-        problemsOfRun(fcBanner + kOpening + "Failed to get adapter attributes - HBA_STATUS_ERROR\n" +
+        problemsOfRun(kFcBanner + kOpening + "Failed to get adapter attributes - HBA_STATUS_ERROR\n" +
                       "Exception occured while opening adapter: acme-0\n" + kOpening +
                       "Encountered non-supported Adapter - HBA_STATUS_ERROR_NOT_SUPPORTED\n"),
         (Lines{
@@ -134,10 +134,10 @@ TEST(ModelBuilder, TellsWhyAnAdapterIsMissing) {
 
 TEST(ModelBuilder, TellsWhyATreeEnded) {
     EXPECT_EQ(
-        problemsOfRun(fcBanner + "Failed to load HBAAPI library : HBA_STATUS_ERROR\n" +
-                      "Caught an Hbaapi Exception in testing 'BuildFcTree\n'" + iscsiBanner +
+        problemsOfRun(kFcBanner + "Failed to load HBAAPI library : HBA_STATUS_ERROR\n" +
+                      "Caught an Hbaapi Exception in testing 'BuildFcTree\n'" + kIscsiBanner +
                       "Failed to open pipe for /sbin/iscsiadm!\n\nCannot proceed with building ISCSI tree\n" +
-                      dasBanner + "Caught exception while building DAS tree: no memory\n\n"),
+                      kDasBanner + "Caught exception while building DAS tree: no memory\n\n"),
         (Lines{"problem, fc, FC: the tree was ended early: the HBA library could not be loaded: "
                "HBA_STATUS_ERROR, line 4",
                "problem, iscsi, ISCSI: the tree was ended early: iscsiadm could not be started, line 8",
@@ -146,8 +146,8 @@ TEST(ModelBuilder, TellsWhyATreeEnded) {
 
 TEST(ModelBuilder, TakesAHostWithoutAdaptersForABuiltTree) {
     const Model model =
-        modelOf(runStart + fcBanner +
-                "Caught exception while building FC tree: There are no adapters on the system\n\n" + runEnd);
+        modelOf(kRunStart + kFcBanner +
+                "Caught exception while building FC tree: There are no adapters on the system\n\n" + kRunEnd);
     EXPECT_EQ(model.fc.state, view::TreeState::Built);
     EXPECT_EQ(problemsOf(model),
               Lines{"note, fc, FC: the HBA library lists no Fibre Channel adapter, line 3"});
@@ -155,13 +155,13 @@ TEST(ModelBuilder, TakesAHostWithoutAdaptersForABuiltTree) {
 
 TEST(ModelBuilder, JoinsThePartsOfAnIscsiPath) {
     const Model model = modelOf(
-        runStart + iscsiBanner +
+        kRunStart + kIscsiBanner +
         "Target IQN 'iqn.t'\nTarget IP '10.0.0.2'\nAdded to DevMap 1 --> /dev/sdc --> 4\n" +
         "Entered Function HA_GetScsiUniqueLunId Line 1\nFound T10 Id: ACME \nOld Unique LunId = x, New Unique LunId = "
         "ACME\nRegister new iSCSI path: init_wwnn=iqn.i, init_wwpn=10.0.0.1, tgt_wwnn=iqn.t, tgt_wwpn=10.0.0.2, lun=7\n"
         "|_ Initiator IQN  iqn.i\n|  |_ Target IQN iqn.t\n         10.0.0.1 <---> 10.0.0.2\n"
         "|  |  |  |_ Device_Name: /dev/sdc sScsiOSLun: 7 LunId: ACME\n\n" +
-        runEnd);
+        kRunEnd);
     EXPECT_EQ(
         sectionOf(model, "iscsi"),
         R"({"state":"built","paths":[{"initiatorIqn":"iqn.i","initiatorPort":"10.0.0.1","targetIqn":"iqn.t",)"
@@ -171,12 +171,12 @@ TEST(ModelBuilder, JoinsThePartsOfAnIscsiPath) {
 
 TEST(ModelBuilder, TellsWhyAnIscsiDiskHasNoIdentifier) {
     const Model model = modelOf(
-        runStart + iscsiBanner +
+        kRunStart + kIscsiBanner +
         "Target IQN 'iqn.t'\nTarget IP '10.0.0.2'\nAdded to DevMap 1 --> /dev/sdc --> 4\n" +
         "Entered Function HA_GetScsiUniqueLunId Line 1\nCannot do Scsi Inquiry on /dev/sdc - No such device\n" +
         "Register new iSCSI path: init_wwnn=iqn.i, init_wwpn=a, tgt_wwnn=iqn.t, tgt_wwpn=b, lun=7\n"
         "|  |_ Target IQN iqn.t\n|  |  |  |_ Device_Name: /dev/sdc sScsiOSLun: 7 LunId: :-( SCSI_Inquiry_Failed\n\n" +
-        runEnd);
+        kRunEnd);
     ASSERT_EQ(model.iscsi.paths.size(), 1);
     EXPECT_EQ(model.iscsi.paths[0].identifier.kind, view::IdentifierKind::None);
     EXPECT_EQ(
@@ -189,7 +189,7 @@ TEST(ModelBuilder, TellsWhyAnIscsiDiskHasNoIdentifier) {
 TEST(ModelBuilder, TellsWhatAnIgnoredIscsiDiskLacks) {
     EXPECT_EQ(
         problemsOfRun(
-            iscsiBanner + "Target IQN 'iqn.t'\nAdded to DevMap 1 --> /dev/sdc --> 4\n" +
+            kIscsiBanner + "Target IQN 'iqn.t'\nAdded to DevMap 1 --> /dev/sdc --> 4\n" +
             "Register new iSCSI path: init_wwnn=iqn.i, init_wwpn=<empty>, tgt_wwnn=iqn.t, tgt_wwpn=, "
             "lun=-1\nIgnoring device /dev/sdc, some param missing!\n"),
         Lines{
@@ -198,17 +198,17 @@ TEST(ModelBuilder, TellsWhatAnIgnoredIscsiDiskLacks) {
 }
 
 TEST(ModelBuilder, NotesASessionWithoutDisksOnce) {
-    EXPECT_EQ(
-        problemsOfRun(iscsiBanner + "Target IQN 'iqn.t'\nTarget IP '10.0.0.2'\n" + iscsiBanner + dasBanner),
-        Lines{"note, iscsi, iqn.t: the session to 10.0.0.2 has no disks, line 3"});
+    EXPECT_EQ(problemsOfRun(kIscsiBanner + "Target IQN 'iqn.t'\nTarget IP '10.0.0.2'\n" + kIscsiBanner +
+                            kDasBanner),
+              Lines{"note, iscsi, iqn.t: the session to 10.0.0.2 has no disks, line 3"});
 }
 
 TEST(ModelBuilder, KnowsADirectDiskByItsHostAndTheReason) {
     const Model model =
-        modelOf(runStart + dasBanner + "Entered Function HA_GetScsiUniqueLunId Line 1\n" +
+        modelOf(kRunStart + kDasBanner + "Entered Function HA_GetScsiUniqueLunId Line 1\n" +
                 "ioctl failed, error code = 25\n\nCaught exception -> ioctl failed, error code = 25\n : "
                 "Adding host name as LUN ID if the device is DAS and rejecting otherwise...\n" +
-                diskLine("/dev/vda", "db1::/dev/vda") + runEnd);
+                diskLine("/dev/vda", "db1::/dev/vda") + kRunEnd);
     EXPECT_EQ(sectionOf(model, "direct"),
               R"({"state":"built","devices":[{"device":"/dev/vda","identifier":"db1::/dev/vda",)"
               R"("identifierKind":"host-name"}]})");
@@ -222,7 +222,7 @@ TEST(ModelBuilder, TellsWhyADirectDeviceIsNotSupported) {
     const std::string begun = "Entered Function HA_GetScsiUniqueLunId Line 1\n";
     EXPECT_EQ(
         problemsOfRun(
-            dasBanner + begun + "--------> Device Name: |/dev/sr0| is not supported\n\n" + begun +
+            kDasBanner + begun + "--------> Device Name: |/dev/sr0| is not supported\n\n" + begun +
             "Cannot do Scsi Inquiry on /dev/sdb - No medium found\n--------> Device Name: |/dev/sdb| is "
             "not supported\n\n"),
         (Lines{
@@ -236,24 +236,24 @@ TEST(ModelBuilder, ListsLogicalDevicesAndTheirHost) {
     const Model model =
         modelOf("============ LOGICAL DEVICE DETAILS ============\n--------> Device Name: |/dev/sda1| LunId: "
                 "|db1 :: /dev/sda1| \n--------> Device Name: |/dev/dm-0| LunId: |db1 :: /dev/dm-0| \n" +
-                runEnd);
+                kRunEnd);
     EXPECT_EQ(sectionOf(model, "logical"), R"({"state":"built","devices":["/dev/sda1","/dev/dm-0"]})");
     EXPECT_EQ(model.host, "db1");
 }
 
 TEST(ModelBuilder, ListsPowerPathsDevices) {
-    const Model model = modelOf(runStart +
+    const Model model = modelOf(kRunStart +
                                 "PowerPath Data : Ulid  Pseudo Name\n               6 emcpowera             "
                                 "  7 emcpowerb\n" +
-                                runEnd);
+                                kRunEnd);
     EXPECT_EQ(sectionOf(model, "multipath"),
               R"({"powerPath":"running","devices":[{"ulid":"6","pseudoDevice":"emcpowera"},)"
               R"({"ulid":"7","pseudoDevice":"emcpowerb"}]})");
 }
 
 TEST(ModelBuilder, TakesANumberThatIsTooGreatForTheGreatest) {
-    const Model model = modelOf(fcBanner + kAdapterLines + kTargetLine +
-                                lunLine("/dev/sdb", "6", "99999999999999999999") + runEnd);
+    const Model model = modelOf(kFcBanner + kAdapterLines + kTargetLine +
+                                lunLine("/dev/sdb", "6", "99999999999999999999") + kRunEnd);
     ASSERT_EQ(model.fc.paths.size(), 1);
     EXPECT_EQ(model.fc.paths[0].lun, UINT64_MAX);
 }
@@ -262,26 +262,26 @@ TEST(ModelBuilder, SaysWhereALogIsCut) {
     const std::string end =
         ", without the closing banner: the run is still going on or was ended, or the file was cut "
         "off, line ";
-    EXPECT_EQ(problemsOf(modelOf(runStart)),
+    EXPECT_EQ(problemsOf(modelOf(kRunStart)),
               Lines{"problem, multipath, log: it ends in the multipath section" + end + "1"});
-    EXPECT_EQ(problemsOf(modelOf(runStart + dasBanner + diskLine("/dev/sda", "6"))),
+    EXPECT_EQ(problemsOf(modelOf(kRunStart + kDasBanner + diskLine("/dev/sda", "6"))),
               Lines{"problem, direct, log: it ends in the DAS section" + end + "3"});
 }
 
 TEST(ModelBuilder, SaysThatAnAssertionEndedTheRunAndNotThatTheLogIsCut) {
     EXPECT_EQ(
-        problemsOf(modelOf(runStart + "Assertion [ lPos != ZebString::npos ] failed\n")),
+        problemsOf(modelOf(kRunStart + "Assertion [ lPos != ZebString::npos ] failed\n")),
         Lines{
             "problem, multipath, run: the program found something that must not be and ended itself: lPos != "
             "ZebString::npos, line 2"});
 }
 
 TEST(ModelBuilder, ForgetsARunWhenTheNextBegins) {
-    const std::string second = runStart + fcBanner + kOpening + runEnd;
+    const std::string second = kRunStart + kFcBanner + kOpening + kRunEnd;
     const Model alone = modelOf(second);
     const Model after =
-        modelOf(runStart + fcBanner + kOpening + identified("/dev/sdb", "6") + kAdapterLines + kTargetLine +
-                lunLine("/dev/sdb", "6") + iscsiBanner + "Target IQN 'iqn.t'\n" + second);
+        modelOf(kRunStart + kFcBanner + kOpening + identified("/dev/sdb", "6") + kAdapterLines + kTargetLine +
+                lunLine("/dev/sdb", "6") + kIscsiBanner + "Target IQN 'iqn.t'\n" + second);
     for (const char* section :
          {"host", "luns", "multipath", "fc", "iscsi", "direct", "logical", "problems"}) {
         EXPECT_EQ(sectionOf(after, section), sectionOf(alone, section));

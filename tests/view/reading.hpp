@@ -8,12 +8,12 @@
 #include "view/show/json.hpp"
 
 // The text with which a run begins and the rules that begin and end a section, as the log has them.
-inline const std::string rule = "================================================\n";
-inline const std::string runStart = "\t\tCheck for Multipath software\n";
-inline const std::string fcBanner = "============== FC DEVICE DETAILS ===============\n";
-inline const std::string iscsiBanner = "============= ISCSI DEVICE DETAILS =============\n";
-inline const std::string dasBanner = "============== DAS DEVICE DETAILS ==============\n";
-inline const std::string runEnd = "\t\t\t   END \n";
+inline const std::string kRule = "================================================\n";
+inline const std::string kRunStart = "\t\tCheck for Multipath software\n";
+inline const std::string kFcBanner = "============== FC DEVICE DETAILS ===============\n";
+inline const std::string kIscsiBanner = "============= ISCSI DEVICE DETAILS =============\n";
+inline const std::string kDasBanner = "============== DAS DEVICE DETAILS ==============\n";
+inline const std::string kRunEnd = "\t\t\t   END \n";
 
 // A direct disk's report line, by which a test sees that a text was read.
 inline std::string diskLine(const std::string& device, const std::string& identifier) {

@@ -13,24 +13,24 @@ namespace {
 // Builds the groups one sighting at a time.
 class LunGroups {
 public:
-    explicit LunGroups(Model& model) : model_(model) {}
+    explicit LunGroups(Model& model) : mModel(model) {}
 
     void addAll() {
-        for (std::size_t i = 0; i < model_.fc.paths.size(); ++i) {
-            const FcPath& path = model_.fc.paths[i];
+        for (std::size_t i = 0; i < mModel.fc.paths.size(); ++i) {
+            const FcPath& path = mModel.fc.paths[i];
             add({Sighting::Place::FcPath, i, 0}, path.identifier, path.facts, path.device);
             addPlace(path.identifier.text, std::to_string(path.adapter) + ' ' + path.targetPort,
                      lunNumbers(path));
         }
-        for (std::size_t i = 0; i < model_.fc.adapters.size(); ++i) {
-            const Adapter& adapter = model_.fc.adapters[i];
+        for (std::size_t i = 0; i < mModel.fc.adapters.size(); ++i) {
+            const Adapter& adapter = mModel.fc.adapters[i];
             for (std::size_t k = 0; k < adapter.unlisted.size(); ++k) {
                 const UnlistedLun& lun = adapter.unlisted[k];
                 add({Sighting::Place::Unlisted, k, i}, lun.identifier, lun.facts, lun.device);
             }
         }
-        for (std::size_t i = 0; i < model_.iscsi.paths.size(); ++i) {
-            const IscsiPath& path = model_.iscsi.paths[i];
+        for (std::size_t i = 0; i < mModel.iscsi.paths.size(); ++i) {
+            const IscsiPath& path = mModel.iscsi.paths[i];
             if (path.identifier.kind != IdentifierKind::None) {
                 add({Sighting::Place::IscsiPath, i, 0}, path.identifier, {}, path.device);
                 addPlace(path.identifier.text,
@@ -38,8 +38,8 @@ public:
                          std::to_string(path.lun));
             }
         }
-        for (std::size_t i = 0; i < model_.direct.devices.size(); ++i) {
-            const DirectDevice& direct = model_.direct.devices[i];
+        for (std::size_t i = 0; i < mModel.direct.devices.size(); ++i) {
+            const DirectDevice& direct = mModel.direct.devices[i];
             if (direct.identifier.kind != IdentifierKind::HostName) {
                 add({Sighting::Place::DirectDevice, i, 0}, direct.identifier, {}, direct.device);
             }
@@ -47,7 +47,7 @@ public:
     }
 
     void judge() {
-        for (Lun& lun : model_.luns) {
+        for (Lun& lun : mModel.luns) {
             const std::string& identifier = lun.identifier.text;
             if (!isTelling(identifier)) {
                 lun.notUnique = identifier.empty()
@@ -56,11 +56,11 @@ public:
                                       "0x83 is given them";
             } else if (lun.identifier.kind == IdentifierKind::StandardInquiry && identifier.ends_with(':')) {
                 lun.notUnique = "vendor, product and revision alone: every device of the model may carry it";
-            } else if (shared_.contains(identifier)) {
+            } else if (mShared.contains(identifier)) {
                 lun.notUnique = "several LUN numbers of one target carry it";
             }
             if (!lun.notUnique.empty()) {
-                model_.problems.push_back(
+                mModel.problems.push_back(
                     {Severity::Problem, ProblemKind::IdentifierNotUnique, Tree::Run, identifier,
                      "not unique, " + std::to_string(lun.devices.size()) +
                          (lun.devices.size() == 1 ? " device carries" : " devices carry") +
@@ -73,32 +73,32 @@ public:
 private:
     void add(Sighting sighting, const Identifier& identifier, const DeviceFacts& facts,
              const std::string& device) {
-        const auto [found, isNew] = lunByIdentifier_.try_emplace(identifier.text, model_.luns.size());
+        const auto [found, isNew] = mLunByIdentifier.try_emplace(identifier.text, mModel.luns.size());
         if (isNew) {
-            model_.luns.emplace_back();
-            model_.luns.back().identifier = identifier;
-            model_.luns.back().facts = facts;
+            mModel.luns.emplace_back();
+            mModel.luns.back().identifier = identifier;
+            mModel.luns.back().facts = facts;
         }
-        Lun& lun = model_.luns[found->second];
+        Lun& lun = mModel.luns[found->second];
         lun.sightings.push_back(sighting);
-        if (devices_.emplace(identifier.text + '\n' + device).second) {
+        if (mDevices.emplace(identifier.text + '\n' + device).second) {
             lun.devices.push_back(device);
         }
     }
 
     // Notes a LUN number at which a target port shows the identifier.
     void addPlace(const std::string& identifier, const std::string& target, const std::string& lun) {
-        const auto [found, isNew] = lunByPlace_.try_emplace(identifier + '\n' + target, lun);
+        const auto [found, isNew] = mLunByPlace.try_emplace(identifier + '\n' + target, lun);
         if (!isNew && found->second != lun) {
-            shared_.insert(identifier);
+            mShared.insert(identifier);
         }
     }
 
-    Model& model_;
-    std::unordered_map<std::string, std::size_t> lunByIdentifier_;
-    std::unordered_set<std::string> devices_;
-    std::unordered_map<std::string, std::string> lunByPlace_;
-    std::unordered_set<std::string> shared_;
+    Model& mModel;
+    std::unordered_map<std::string, std::size_t> mLunByIdentifier;
+    std::unordered_set<std::string> mDevices;
+    std::unordered_map<std::string, std::string> mLunByPlace;
+    std::unordered_set<std::string> mShared;
 };
 
 } // namespace

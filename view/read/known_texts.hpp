@@ -5,6 +5,18 @@
 
 namespace view {
 
+// The part of a run that writes a text.
+enum class Section : unsigned char {
+    Any, // every part
+    Run, // what frames the others
+    Multipath,
+    Fc,
+    Iscsi,
+    Direct,
+    Logical,
+    Inquiry, // the claiming and identifying of a device, which FC, iSCSI and direct share
+};
+
 // What a text of the log tells the reader. Progress stands for every text that carries nothing the model
 // needs.
 enum class Text : unsigned char {
@@ -33,7 +45,6 @@ enum class Text : unsigned char {
     FcBuildTime,
     FcHbaError,
     FcError,
-    NoAdapters,
     AdapterNameFailed,
     OpeningAdapter,
     OpenAdapterFailed,
@@ -70,17 +81,13 @@ enum class Text : unsigned char {
     IscsiTargetLine,
     IscsiAddressLine,
     IscsiDeviceLine,
-    IscsiPortEmpty,
 
     DeviceRegistered,
-    DeviceIdFailed,
     DeviceUnsupported,
     DeviceLine,
     LogicalLine,
     NotADevice,
-    SysBlockFailed,
     DasFailed,
-    PartitionsFailed,
     LogicalFailed,
     PartitionLineInvalid,
 
@@ -94,7 +101,6 @@ enum class Text : unsigned char {
     FoundScsiName,
     ChosenId,
     StandardInquiryId,
-    PageNoDescriptor,
     PageMalformed,
     PageStatus,
     PageIoctl,
@@ -121,6 +127,7 @@ enum class Text : unsigned char {
 struct KnownText {
     Text text;
     std::string_view format;
+    Section section = Section::Any; // of Progress and OpenEnded, which no part reads
 };
 
 // Every text Morvane writes, in no particular order.

@@ -12,20 +12,20 @@ namespace view {
 namespace {
 
 // A text is followed over at most this many lines and bytes before its first line counts as unknown.
-constexpr std::ptrdiff_t maximumHeldLines = 32;
-constexpr std::size_t maximumHeldBytes = 16UL * 1024;
+constexpr std::ptrdiff_t kMaximumHeldLines = 32;
+constexpr std::size_t kMaximumHeldBytes = 16UL * 1024;
 
 // A line is the table of PowerPath's devices at its longest; of a longer one the rest is taken as a line
 // anew.
-constexpr std::size_t maximumLine = 16UL * 1024 * 1024;
+constexpr std::size_t kMaximumLine = 16UL * 1024 * 1024;
 
-constexpr std::size_t maximumSamples = 5;
-constexpr std::size_t sampleLength = 120;
+constexpr std::size_t kMaximumSamples = 5;
+constexpr std::size_t kSampleLength = 120;
 
-constexpr std::array<std::string_view, 2> traceBeginnings = {"Entered Function ", "Left Function "};
+constexpr std::array<std::string_view, 2> kTraceBeginnings = {"Entered Function ", "Left Function "};
 
 bool isTrace(std::string_view line) {
-    return std::any_of(traceBeginnings.begin(), traceBeginnings.end(),
+    return std::any_of(kTraceBeginnings.begin(), kTraceBeginnings.end(),
                        [line](std::string_view beginning) { return line.starts_with(beginning); });
 }
 
@@ -33,7 +33,7 @@ bool isTrace(std::string_view line) {
 // trace line goes on to the end of its line, so no other one matters.
 std::size_t findTrace(std::string_view line) {
     std::size_t last = 0;
-    for (const std::string_view beginning : traceBeginnings) {
+    for (const std::string_view beginning : kTraceBeginnings) {
         const std::size_t found = line.rfind(beginning);
         last = std::max(last, found == std::string_view::npos ? 0 : found);
     }
@@ -46,7 +46,7 @@ std::ptrdiff_t lineEndsIn(std::string_view bytes) {
 
 // Whether a text that begins `bytes` may still go on behind them.
 bool mayGoOn(std::string_view bytes) {
-    return bytes.size() <= maximumHeldBytes && lineEndsIn(bytes) < maximumHeldLines;
+    return bytes.size() <= kMaximumHeldBytes && lineEndsIn(bytes) < kMaximumHeldLines;
 }
 
 // The one of all readers: it is the same for each of many logs.
@@ -58,35 +58,35 @@ const TextMatcher& matcher() {
 } // namespace
 
 LogReader::LogReader(std::string name) {
-    facts_.name = std::move(name);
+    mFacts.name = std::move(name);
 }
 
 void LogReader::feed(std::string_view bytes) {
-    facts_.bytes += bytes.size();
+    mFacts.bytes += bytes.size();
     while (!bytes.empty()) {
-        const std::string_view front = bytes.substr(0, maximumLine - partialLine_.size());
+        const std::string_view front = bytes.substr(0, kMaximumLine - mPartialLine.size());
         const std::size_t end = front.find('\n');
         const std::string_view part = front.substr(0, end == std::string_view::npos ? end : end + 1);
         bytes.remove_prefix(part.size());
-        if (end == std::string_view::npos && partialLine_.size() + part.size() < maximumLine) {
-            partialLine_ += part;
-        } else if (partialLine_.empty()) {
+        if (end == std::string_view::npos && mPartialLine.size() + part.size() < kMaximumLine) {
+            mPartialLine += part;
+        } else if (mPartialLine.empty()) {
             takeLine(part);
         } else {
-            partialLine_ += part;
-            takeLine(std::exchange(partialLine_, {}));
+            mPartialLine += part;
+            takeLine(std::exchange(mPartialLine, {}));
         }
     }
 }
 
 Model LogReader::finish() {
-    if (!partialLine_.empty()) {
-        takeLine(std::exchange(partialLine_, {}));
+    if (!mPartialLine.empty()) {
+        takeLine(std::exchange(mPartialLine, {}));
     }
-    takeTexts(held_, false);
-    facts_.cutInLine = isInLine_;
-    facts_.lines = line_ - (isInLine_ ? 0 : 1);
-    Model model = builder_.finish(std::move(facts_));
+    takeTexts(mHeld, false);
+    mFacts.cutInLine = mIsInLine;
+    mFacts.lines = mLine - (mIsInLine ? 0 : 1);
+    Model model = mBuilder.finish(std::move(mFacts));
     groupLuns(model);
     return model;
 }
@@ -94,13 +94,13 @@ Model LogReader::finish() {
 // Takes a line with its line end, or holds it.
 void LogReader::takeLine(std::string_view line) {
     if (isTrace(line)) { // the rest of a held text never comes
-        takeTexts(std::exchange(held_, {}), false);
+        takeTexts(std::exchange(mHeld, {}), false);
     }
-    if (held_.empty()) {
-        held_ = line.substr(takeTexts(line, true));
+    if (mHeld.empty()) {
+        mHeld = line.substr(takeTexts(line, true));
     } else {
-        held_ += line;
-        held_.erase(0, takeTexts(held_, true));
+        mHeld += line;
+        mHeld.erase(0, takeTexts(mHeld, true));
     }
 }
 
@@ -114,7 +114,7 @@ std::size_t LogReader::takeTexts(std::string_view bytes, bool mayWait) {
             const std::string_view line = bytes.substr(at, lineEnd - at);
             TextMatch match;
             MatchResult result = matcher().match(line, match);
-            if (result == MatchResult::Unending && (isInLine_ || !inOpenText_)) {
+            if (result == MatchResult::Unending && (mIsInLine || !mInOpenText)) {
                 const std::string_view lines = bytes.substr(at);
                 if (mayWait && mayGoOn(lines)) {
                     return at;
@@ -142,32 +142,32 @@ std::size_t LogReader::takeTexts(std::string_view bytes, bool mayWait) {
 }
 
 void LogReader::takeKnown(const TextMatch& match, std::string_view bytes) {
-    ++facts_.knownTexts;
-    facts_.gluedTexts += isInLine_ ? 1 : 0;
-    facts_.knownBytes += bytes.size();
-    inOpenText_ = match.text == Text::OpenEnded;
-    builder_.take(match, line_);
-    line_ += static_cast<std::uint64_t>(lineEndsIn(bytes));
-    isInLine_ = true;
+    ++mFacts.knownTexts;
+    mFacts.gluedTexts += mIsInLine ? 1 : 0;
+    mFacts.knownBytes += bytes.size();
+    mInOpenText = match.text == Text::OpenEnded;
+    mBuilder.take(match, mLine);
+    mLine += static_cast<std::uint64_t>(lineEndsIn(bytes));
+    mIsInLine = true;
 }
 
 void LogReader::takeUnknown(std::string_view bytes) {
-    isInLine_ = true;
-    if (inOpenText_) {
-        facts_.knownBytes += bytes.size();
+    mIsInLine = true;
+    if (mInOpenText) {
+        mFacts.knownBytes += bytes.size();
         return;
     }
-    facts_.unknownBytes += bytes.size();
-    ++facts_.unknownPieces;
-    if (facts_.unknownSamples.size() < maximumSamples) {
-        facts_.unknownSamples.push_back({line_, std::string(bytes.substr(0, sampleLength))});
+    mFacts.unknownBytes += bytes.size();
+    ++mFacts.unknownPieces;
+    if (mFacts.unknownSamples.size() < kMaximumSamples) {
+        mFacts.unknownSamples.push_back({mLine, std::string(bytes.substr(0, kSampleLength))});
     }
 }
 
 void LogReader::takeLineEnd() {
-    ++facts_.knownBytes;
-    ++line_;
-    isInLine_ = false;
+    ++mFacts.knownBytes;
+    ++mLine;
+    mIsInLine = false;
 }
 
 Model readLog(std::istream& input, const std::string& name) {

@@ -31,13 +31,13 @@ private:
     void takeUnknown(std::string_view bytes);
     void takeLineEnd();
 
-    ModelBuilder builder_;
-    LogFacts facts_;
-    std::string partialLine_; // the beginning of a line whose end has not come yet
-    std::string held_;        // lines whose first text may go on in the next one
-    std::uint64_t line_ = 1;  // number of the line that is being cut into texts
-    bool isInLine_ = false;   // behind the first byte of that line
-    bool inOpenText_ = false; // behind foreign text that may run over several lines
+    ModelBuilder mBuilder;
+    LogFacts mFacts;
+    std::string mPartialLine; // the beginning of a line whose end has not come yet
+    std::string mHeld;        // lines whose first text may go on in the next one
+    std::uint64_t mLine = 1;  // number of the line that is being cut into texts
+    bool mIsInLine = false;   // behind the first byte of that line
+    bool mInOpenText = false; // behind foreign text that may run over several lines
 };
 
 // Reads a whole stream.

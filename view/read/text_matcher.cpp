@@ -7,27 +7,27 @@ namespace view {
 namespace {
 
 // A text that ends in a field and has no line end runs up to whatever comes next on its line.
-constexpr std::array<std::string_view, 6> followers = {
+constexpr std::array<std::string_view, 6> kFollowers = {
     "Entered Function ", "Left Function ", "Line: ", "End of popened Buffer", "Incomplete line: ", "\n",
 };
-constexpr std::string_view nextPowerPathEntry = "               ";
+constexpr std::string_view kNextPowerPathEntry = "               ";
 
 // Below this many leading bytes a text is too common to wait for its rest.
-constexpr std::size_t shortestOpening = 8;
+constexpr std::size_t kShortestOpening = 8;
 
 // The longest text field, in bytes: PATH_MAX, and more than the 3999 that the program reads of a command's
 // output at once. What devices and libraries fill in is shorter: 510 hexadecimal digits of a designator, 256
 // characters of an HBA's attribute, 223 of an iSCSI name. Without a limit, each text of a long line would
 // search all of it.
-constexpr std::size_t longestField = 4096;
+constexpr std::size_t kLongestField = 4096;
 
 std::size_t findFollower(Text text, std::string_view bytes, std::size_t from) {
     for (std::size_t at = bytes.find_first_of("ELI \n", from); at != std::string_view::npos;
          at = bytes.find_first_of("ELI \n", at + 1)) {
         const std::string_view rest = bytes.substr(at);
         const auto begins = [rest](std::string_view follower) { return rest.starts_with(follower); };
-        if (std::any_of(followers.begin(), followers.end(), begins) ||
-            (text == Text::PowerPathEntry && begins(nextPowerPathEntry))) {
+        if (std::any_of(kFollowers.begin(), kFollowers.end(), begins) ||
+            (text == Text::PowerPathEntry && begins(kNextPowerPathEntry))) {
             return at;
         }
     }
@@ -36,7 +36,7 @@ std::size_t findFollower(Text text, std::string_view bytes, std::size_t from) {
 
 // The end of the line, as far as a field may reach.
 std::size_t findLineEnd(std::string_view bytes, std::size_t from) {
-    const std::string_view reach = bytes.substr(0, from + longestField + 1);
+    const std::string_view reach = bytes.substr(0, from + kLongestField + 1);
     return std::min(reach.find('\n', from), reach.size());
 }
 
@@ -62,14 +62,14 @@ std::size_t runEnd(std::string_view bytes, std::size_t from, Accepts accepts) {
 
 } // namespace
 
-TextMatcher::TextMatcher(std::span<const KnownText> texts) : patternsByFirstByte_(256) {
+TextMatcher::TextMatcher(std::span<const KnownText> texts) : mPatternsByFirstByte(256) {
     for (const KnownText& known : texts) {
         Pattern pattern = compile(known);
         const auto first = static_cast<unsigned char>(pattern.pieces.front().literal.front());
-        patternsByFirstByte_[first].push_back(std::move(pattern));
+        mPatternsByFirstByte[first].push_back(std::move(pattern));
     }
     // A longer opening goes before a shorter one, a text with a line end before the same text without one.
-    for (std::vector<Pattern>& patterns : patternsByFirstByte_) {
+    for (std::vector<Pattern>& patterns : mPatternsByFirstByte) {
         std::stable_sort(patterns.begin(), patterns.end(), [](const Pattern& a, const Pattern& b) {
             const std::size_t openingOfA = a.pieces.front().literal.size();
             const std::size_t openingOfB = b.pieces.front().literal.size();
@@ -79,7 +79,7 @@ TextMatcher::TextMatcher(std::span<const KnownText> texts) : patternsByFirstByte
 }
 
 TextMatcher::Pattern TextMatcher::compile(const KnownText& known) {
-    Pattern pattern{known.text, false, false, {}};
+    Pattern pattern{known.text, known.section, false, false, {}};
     std::string_view format = known.format;
     if (format.ends_with('\n')) {
         pattern.endsLine = true;
@@ -131,7 +131,7 @@ MatchResult TextMatcher::match(std::string_view bytes, TextMatch& match) const {
         return MatchResult::None;
     }
     MatchResult result = MatchResult::None;
-    for (const Pattern& pattern : patternsByFirstByte_[static_cast<unsigned char>(bytes.front())]) {
+    for (const Pattern& pattern : mPatternsByFirstByte[static_cast<unsigned char>(bytes.front())]) {
         const std::string_view opening = pattern.pieces.front().literal;
         if (!bytes.starts_with(opening)) {
             continue;
@@ -139,7 +139,7 @@ MatchResult TextMatcher::match(std::string_view bytes, TextMatch& match) const {
         if (matchPattern(pattern, bytes, match)) {
             return MatchResult::Found;
         }
-        if (pattern.mayRunOver && opening.size() >= shortestOpening) {
+        if (pattern.mayRunOver && opening.size() >= kShortestOpening) {
             result = MatchResult::Unending;
         }
     }
@@ -151,6 +151,7 @@ MatchResult TextMatcher::match(std::string_view bytes, TextMatch& match) const {
 // one. So the work grows with the bytes, whatever they are.
 bool TextMatcher::matchPattern(const Pattern& pattern, std::string_view bytes, TextMatch& match) {
     match.text = pattern.text;
+    match.section = pattern.section;
     match.fieldCount = 0;
     Position position;
     if (!matchUpToText(pattern, bytes, position, match)) {
@@ -160,7 +161,7 @@ bool TextMatcher::matchPattern(const Pattern& pattern, std::string_view bytes, T
         const std::string_view next = pattern.pieces[position.piece].literal;
         const std::size_t start = position.at;
         const std::size_t slot = match.fieldCount;
-        const std::string_view reach = bytes.substr(0, start + longestField + next.size());
+        const std::string_view reach = bytes.substr(0, start + kLongestField + next.size());
         Position behind;
         for (std::size_t end = reach.find(next, start);; end = reach.find(next, end + 1)) {
             if (end == std::string_view::npos) {
@@ -214,7 +215,7 @@ std::size_t TextMatcher::fieldEnd(const Pattern& pattern, Field field, std::stri
     switch (field) {
     case Field::Text:
         end = pattern.endsLine ? findLineEnd(bytes, at) : findFollower(pattern.text, bytes, at);
-        return end - at <= longestField ? end : std::string_view::npos;
+        return end - at <= kLongestField ? end : std::string_view::npos;
     case Field::Decimal:
         end = runEnd(bytes, at + (bytes.substr(at).starts_with('-') ? 1 : 0), isDecimal);
         break;

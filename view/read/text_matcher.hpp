@@ -12,11 +12,12 @@ namespace view {
 
 // A known text found at the start of some bytes of the log. The fields point into those bytes.
 struct TextMatch {
-    static constexpr std::size_t maximumFields = 5;
+    static constexpr std::size_t kMaximumFields = 5;
 
     Text text = Text::Progress;
+    Section section = Section::Any;
     std::size_t length = 0; // bytes of the match, a line end not counted
-    std::array<std::string_view, maximumFields> fields;
+    std::array<std::string_view, kMaximumFields> fields;
     std::size_t fieldCount = 0;
 };
 
@@ -47,6 +48,7 @@ private:
 
     struct Pattern {
         Text text;
+        Section section;
         bool endsLine;
         bool mayRunOver; // a text field stands before a literal that must follow
         std::vector<Piece> pieces;
@@ -65,7 +67,7 @@ private:
                               TextMatch& match);
     static std::size_t fieldEnd(const Pattern& pattern, Field field, std::string_view bytes, std::size_t at);
 
-    std::vector<std::vector<Pattern>> patternsByFirstByte_;
+    std::vector<std::vector<Pattern>> mPatternsByFirstByte;
 };
 
 } // namespace view

@@ -60,7 +60,7 @@ bool isShown(std::uint32_t code) {
 } // namespace
 
 std::string printable(std::string_view bytes) {
-    static constexpr std::string_view digits = "0123456789ABCDEF";
+    static constexpr std::string_view kDigits = "0123456789ABCDEF";
     std::string shown;
     shown.reserve(bytes.size());
     while (!bytes.empty()) {
@@ -70,8 +70,8 @@ std::string printable(std::string_view bytes) {
             for (const char c : bytes.substr(0, length)) {
                 const auto byte = static_cast<unsigned char>(c);
                 shown += "\\x";
-                shown += digits[byte >> 4U];
-                shown += digits[byte & 0x0fU];
+                shown += kDigits[byte >> 4U];
+                shown += kDigits[byte & 0x0fU];
             }
         } else if (character.code == '\\') {
             shown += "\\\\";

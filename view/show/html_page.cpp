@@ -8,7 +8,7 @@ namespace view {
 
 namespace {
 
-constexpr std::string_view documentMark = "/*DOCUMENT*/";
+constexpr std::string_view kDocumentMark = "/*DOCUMENT*/";
 
 // JSON that cannot end the script element it stands in.
 std::string forScript(const nlohmann::ordered_json& document) {
@@ -28,9 +28,9 @@ std::string forScript(const nlohmann::ordered_json& document) {
 } // namespace
 
 void writePage(std::ostream& output, const nlohmann::ordered_json& document) {
-    const std::size_t mark = pageTemplate.find(documentMark);
-    output << pageTemplate.substr(0, mark) << forScript(document)
-           << pageTemplate.substr(mark + documentMark.size());
+    const std::size_t mark = kPageTemplate.find(kDocumentMark);
+    output << kPageTemplate.substr(0, mark) << forScript(document)
+           << kPageTemplate.substr(mark + kDocumentMark.size());
 }
 
 } // namespace view

@@ -9,7 +9,7 @@ namespace view {
 namespace {
 
 // A longer cell pushes the rest of its line on instead of every other line's.
-constexpr std::size_t widestColumn = 64;
+constexpr std::size_t kWidestColumn = 64;
 
 // The number of characters in well-formed UTF-8.
 std::size_t width(std::string_view text) {
@@ -27,19 +27,19 @@ Style Style::of(bool colour) {
 }
 
 void Columns::add(std::vector<std::string> cells) {
-    lines_.push_back(std::move(cells));
+    mLines.push_back(std::move(cells));
 }
 
 void Columns::write(std::ostream& output, std::string_view indent) const {
     std::vector<std::size_t> widths;
-    for (const std::vector<std::string>& cells : lines_) {
+    for (const std::vector<std::string>& cells : mLines) {
         widths.resize(std::max(widths.size(), cells.size()));
         for (std::size_t i = 0; i < cells.size(); ++i) {
             const std::size_t cell = width(cells[i]);
-            widths[i] = std::max(widths[i], std::min(cell, widestColumn));
+            widths[i] = std::max(widths[i], std::min(cell, kWidestColumn));
         }
     }
-    for (const std::vector<std::string>& cells : lines_) {
+    for (const std::vector<std::string>& cells : mLines) {
         std::string line(indent);
         for (std::size_t i = 0; i < cells.size(); ++i) {
             if (widths[i] > 0) {

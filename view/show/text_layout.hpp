@@ -29,7 +29,7 @@ public:
     void write(std::ostream& output, std::string_view indent) const;
 
 private:
-    std::vector<std::vector<std::string>> lines_;
+    std::vector<std::vector<std::string>> mLines;
 };
 
 // Writes a heading line with a blank line before it.

@@ -16,33 +16,33 @@ std::string_view pick(const std::array<std::string_view, Count>& names, Enumerat
 } // namespace
 
 std::string_view name(Tree tree) {
-    static constexpr std::array<std::string_view, 6> names = {"run",   "multipath", "fc",
-                                                              "iscsi", "direct",    "logical"};
-    return pick(names, tree);
+    static constexpr std::array<std::string_view, 6> kNames = {"run",   "multipath", "fc",
+                                                               "iscsi", "direct",    "logical"};
+    return pick(kNames, tree);
 }
 
 std::string_view name(TreeState state) {
-    static constexpr std::array<std::string_view, 4> names = {"absent", "cut", "built", "ended"};
-    return pick(names, state);
+    static constexpr std::array<std::string_view, 4> kNames = {"absent", "cut", "built", "ended"};
+    return pick(kNames, state);
 }
 
 std::string_view name(AdapterState state) {
-    static constexpr std::array<std::string_view, 4> names = {"cut", "reported", "unsupported", "failed"};
-    return pick(names, state);
+    static constexpr std::array<std::string_view, 4> kNames = {"cut", "reported", "unsupported", "failed"};
+    return pick(kNames, state);
 }
 
 std::string_view name(PowerPathState state) {
-    static constexpr std::array<std::string_view, 3> names = {"unknown", "not running", "running"};
-    return pick(names, state);
+    static constexpr std::array<std::string_view, 3> kNames = {"unknown", "not running", "running"};
+    return pick(kNames, state);
 }
 
 std::string_view name(Severity severity) {
-    static constexpr std::array<std::string_view, 2> names = {"problem", "note"};
-    return pick(names, severity);
+    static constexpr std::array<std::string_view, 2> kNames = {"problem", "note"};
+    return pick(kNames, severity);
 }
 
 std::string_view name(ProblemKind kind) {
-    static constexpr std::array<std::string_view, 19> names = {
+    static constexpr std::array<std::string_view, 19> kNames = {
         "log-cut",
         "assertion-failed",
         "tree-ended",
@@ -63,13 +63,13 @@ std::string_view name(ProblemKind kind) {
         "entry-ignored",
         "identifier-not-unique",
     };
-    return pick(names, kind);
+    return pick(kNames, kind);
 }
 
 std::string_view name(IdentifierKind kind) {
-    static constexpr std::array<std::string_view, 9> names = {
+    static constexpr std::array<std::string_view, 9> kNames = {
         "unknown", "naa", "t10", "eui-64", "scsi-name", "md5", "standard-inquiry", "host-name", "none"};
-    return pick(names, kind);
+    return pick(kNames, kind);
 }
 
 std::string counted(std::uint64_t count, std::string_view one) {

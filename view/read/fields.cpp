@@ -1,0 +1,24 @@
+#include "view/read/fields.hpp"
+
+namespace view {
+
+std::string text(std::string_view field) {
+    return std::string(field);
+}
+
+std::string withoutLineEnd(std::string_view message) {
+    while (message.ends_with('\n')) {
+        message.remove_suffix(1);
+    }
+    return std::string(message);
+}
+
+std::string join(const std::vector<std::string>& parts, std::string_view between) {
+    std::string joined;
+    for (const std::string& part : parts) {
+        joined += joined.empty() ? part : std::string(between) + part;
+    }
+    return joined;
+}
+
+} // namespace view

@@ -1,0 +1,29 @@
+#pragma once
+
+#include <charconv>
+#include <limits>
+#include <string>
+#include <string_view>
+#include <system_error>
+#include <vector>
+
+namespace view {
+
+// The number that a field's digits stand for; the greatest when it is too great, 0 when there are none.
+template <typename Number>
+Number toNumber(std::string_view digits) {
+    Number number = 0;
+    const auto [end, error] = std::from_chars(digits.data(), digits.data() + digits.size(), number);
+    return error == std::errc::result_out_of_range ? std::numeric_limits<Number>::max() : number;
+}
+
+// A field's bytes, as their owner.
+std::string text(std::string_view field);
+
+// An exception's message, which may end with line ends, without them.
+std::string withoutLineEnd(std::string_view message);
+
+// Joins parts with `between` between them.
+std::string join(const std::vector<std::string>& parts, std::string_view between);
+
+} // namespace view

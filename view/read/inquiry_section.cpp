@@ -1,0 +1,176 @@
+#include "view/read/inquiry_section.hpp"
+
+#include <system_error>
+#include <utility>
+
+#include "view/read/draft.hpp"
+#include "view/read/fields.hpp"
+
+namespace view {
+
+namespace {
+
+// At most three texts tell why an identification failed: of page 0x83, of the standard data, of a stale
+// entry. Bytes that only look like a log may hold any number of them, and every device would repeat them all.
+constexpr std::size_t kMaximumCauses = 4;
+
+constexpr std::string_view kTimedOut = "time-out"; // said by the causes themselves
+
+// The name SAM gives a SCSI status code.
+std::string scsiStatusName(unsigned code) {
+    switch (code) {
+    case 0x08:
+        return "BUSY";
+    case 0x18:
+        return "RESERVATION CONFLICT";
+    case 0x28:
+        return "TASK SET FULL";
+    case 0x30:
+        return "ACA ACTIVE";
+    case 0x40:
+        return "TASK ABORTED";
+    default:
+        return std::to_string(code);
+    }
+}
+
+std::string errorName(int number) {
+    return "errno " + std::to_string(number) + ", " + std::system_category().message(number);
+}
+
+} // namespace
+
+void InquirySection::take(const TextMatch& match) {
+    switch (match.text) {
+    case Text::InquiryOpenFailed:
+        mDevice = text(match.fields[0]);
+        fail("the device node could not be opened: " + text(match.fields[1]));
+        break;
+    case Text::InquiryTypeFailed:
+        if (mAnswers.detail.empty()) {
+            mAnswers.detail = withoutLineEnd(match.fields[0]);
+        }
+        fail(mAnswers.detail == kTimedOut ? "the first INQUIRY timed out" : "the first INQUIRY failed");
+        break;
+    case Text::InquiryPage:
+        mAnswers.pageAsked = true;
+        break;
+    case Text::FoundNaa:
+        mAnswers.found.insert(IdentifierKind::Naa);
+        break;
+    case Text::FoundT10:
+        mAnswers.found.insert(IdentifierKind::T10);
+        break;
+    case Text::FoundEui64:
+        mAnswers.found.insert(IdentifierKind::Eui64);
+        break;
+    case Text::FoundMd5:
+        mAnswers.found.insert(IdentifierKind::Md5);
+        break;
+    case Text::FoundScsiName:
+        mAnswers.found.insert(IdentifierKind::ScsiName);
+        break;
+    case Text::ChosenId: // the enumerators stand in the order of preference
+        mAnswers.chosen = mAnswers.found.empty() ? IdentifierKind::Unknown : *mAnswers.found.begin();
+        break;
+    case Text::StandardInquiryId:
+        mAnswers.chosen = IdentifierKind::StandardInquiry;
+        break;
+    case Text::PageMalformed:
+        fail("page 0x83 is malformed");
+        break;
+    case Text::PageStatus:
+        fail("reading page 0x83 ended with a SCSI error");
+        break;
+    case Text::PageIoctl:
+        fail("reading page 0x83 failed in the kernel");
+        break;
+    case Text::PageUnsupported:
+        fail("the device has no page 0x83", false);
+        break;
+    case Text::PageTimeOut:
+        fail("reading page 0x83 timed out");
+        break;
+    case Text::StandardTimeOut:
+        fail("the standard INQUIRY timed out");
+        break;
+    case Text::StandardUnsupported:
+        fail("the device refused the standard INQUIRY");
+        break;
+    case Text::StandardIoctl:
+        fail("the standard INQUIRY failed in the kernel");
+        break;
+    case Text::StandardStatus:
+        fail("the standard INQUIRY ended with a SCSI error");
+        break;
+    case Text::StandardMalformed:
+        fail("its standard INQUIRY data are malformed");
+        break;
+    case Text::StandardUnparsable:
+        fail("its standard INQUIRY data could not be read");
+        break;
+    case Text::StandardExpired:
+        fail("its entry in the file system is stale");
+        break;
+    default:
+        takeScsi(match);
+        break;
+    }
+}
+
+void InquirySection::takeScsi(const TextMatch& match) {
+    std::string& detail = mAnswers.detail;
+    switch (match.text) {
+    case Text::ScsiStatus:
+        detail = "SCSI status " + scsiStatusName(toNumber<unsigned>(match.fields[1]));
+        break;
+    case Text::ScsiSense:
+        detail = "CHECK CONDITION";
+        break;
+    case Text::ScsiTransport:
+        detail = "the transport failed";
+        break;
+    case Text::ScsiTimeOut:
+        detail = kTimedOut;
+        break;
+    case Text::ScsiIoctl:
+        detail = errorName(toNumber<int>(match.fields[0]));
+        break;
+    case Text::ScsiInvalidOpcode:
+        detail = "ILLEGAL REQUEST, invalid opcode";
+        break;
+    case Text::ScsiIllegalRequest:
+        detail = "ILLEGAL REQUEST";
+        break;
+    default:
+        break;
+    }
+}
+
+// Notes a cause in the words given, with what the SCSI layer said of the command.
+void InquirySection::fail(std::string_view words, bool isFailure) {
+    std::string cause(words);
+    if (!mAnswers.detail.empty() && mAnswers.detail != kTimedOut) {
+        cause += " (" + mAnswers.detail + ")";
+    }
+    mAnswers.detail.clear();
+    if (mAnswers.causes.size() < kMaximumCauses) {
+        mAnswers.causes.push_back(std::move(cause));
+    }
+    mAnswers.failed = mAnswers.failed || isFailure;
+}
+
+std::string InquirySection::cause(std::string_view device) const {
+    if (hasCause()) {
+        return join(mAnswers.causes, "; ");
+    }
+    if (device.find("/sg") != std::string_view::npos) {
+        return "an sg node; only disk nodes are read";
+    }
+    if (isOfWrongType()) {
+        return "its device type is neither disk nor storage array controller";
+    }
+    return text(kNoCause);
+}
+
+} // namespace view

@@ -1,0 +1,60 @@
+#pragma once
+
+#include <set>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "view/model/model.hpp"
+#include "view/read/text_matcher.hpp"
+
+namespace view {
+
+// Reads what the log says of the device that is being identified: which SCSI commands failed and why, where
+// the identifier came from.
+class InquirySection {
+public:
+    // Takes a text of Section::Inquiry.
+    void take(const TextMatch& match);
+
+    // Forgets everything but the device: the next identification begins.
+    void begin() { mAnswers = {}; }
+
+    // Names the device that is being identified; empty when the log does not tell.
+    void setDevice(std::string_view device) { mDevice = device; }
+    [[nodiscard]] const std::string& device() const { return mDevice; }
+
+    // Where the identifier came from.
+    [[nodiscard]] IdentifierKind chosen() const { return mAnswers.chosen; }
+
+    // Whether the log has a cause of its own for a failed identification.
+    [[nodiscard]] bool hasCause() const { return !mAnswers.causes.empty(); }
+
+    // Whether something failed, and not just a page is missing that not every device has.
+    [[nodiscard]] bool hasFailed() const { return mAnswers.failed; }
+
+    // Whether the device was turned away by its type: without a word, and before page 0x83 was asked for.
+    [[nodiscard]] bool isOfWrongType() const { return !hasCause() && !mAnswers.pageAsked; }
+
+    // Why `device` could not be identified. Some refusals leave no text of their own; they are told by what
+    // is missing.
+    [[nodiscard]] std::string cause(std::string_view device) const;
+
+private:
+    struct Answers {
+        std::vector<std::string> causes;
+        std::string detail; // of the command under way: why it failed
+        bool pageAsked = false;
+        bool failed = false;
+        std::set<IdentifierKind> found;
+        IdentifierKind chosen = IdentifierKind::Unknown;
+    };
+
+    void takeScsi(const TextMatch& match);
+    void fail(std::string_view words, bool isFailure = true);
+
+    std::string mDevice;
+    Answers mAnswers;
+};
+
+} // namespace view
