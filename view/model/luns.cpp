@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <string>
+#include <string_view>
 #include <unordered_map>
 #include <unordered_set>
 #include <utility>
@@ -9,6 +10,11 @@
 namespace view {
 
 namespace {
+
+// Whether a text tells one logical unit from another at all: it is neither empty nor all blanks or zeros.
+bool isTelling(std::string_view identifier) {
+    return identifier.find_first_not_of("0 ") != std::string_view::npos;
+}
 
 // Builds the groups one sighting at a time.
 class LunGroups {
@@ -102,10 +108,6 @@ private:
 };
 
 } // namespace
-
-bool isTelling(std::string_view identifier) {
-    return identifier.find_first_not_of("0 ") != std::string_view::npos;
-}
 
 void groupLuns(Model& model) {
     LunGroups groups(model);

@@ -15,6 +15,21 @@
 
 namespace view {
 
+// What is known of the adapter under way, the last one of the model.
+struct OpenAdapter {
+    bool openingSeen = false; // its opening is in the log
+    bool treeLineSeen = false;
+    std::vector<DeviceFacts> vendorPass; // of its LUNs, in the order of the mapping
+    std::size_t identityPass = 0;        // LUNs whose identification has begun, in the same order
+    std::map<std::string, std::pair<std::uint64_t, std::string>>
+        lunAndTarget; // of devices without vendor data
+    std::set<std::pair<std::string, std::string>> unnamed;
+    std::vector<UnlistedLun> identified;
+    std::map<std::string, std::size_t> identifiedByDevice;
+    std::unordered_set<std::string> listed;
+    FcPath targetLine; // target fields of the last target line
+};
+
 // Reads the Fibre Channel section: adapter by adapter what was found, then what its tree lists of it.
 class FcSection {
 public:
@@ -31,21 +46,6 @@ public:
     void close();
 
 private:
-    // The adapter under way: the last one of the model.
-    struct OpenAdapter {
-        bool openingSeen = false; // its opening is in the log
-        bool treeLineSeen = false;
-        std::vector<DeviceFacts> vendorPass; // of its LUNs, in the order of the mapping
-        std::size_t identityPass = 0;        // LUNs whose identification has begun, in the same order
-        std::map<std::string, std::pair<std::uint64_t, std::string>>
-            lunAndTarget; // of devices without vendor data
-        std::set<std::pair<std::string, std::string>> unnamed;
-        std::vector<UnlistedLun> identified;
-        std::map<std::string, std::size_t> identifiedByDevice;
-        std::unordered_set<std::string> listed;
-        FcPath targetLine; // target fields of the last target line
-    };
-
     void takeMapping(const TextMatch& match);
     void takeTree(const TextMatch& match);
     void addIdentified(const TextMatch& match);

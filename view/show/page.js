@@ -6,34 +6,46 @@
   const esc = (value) => String(value ?? "").replace(/[&<>"']/g, (c) => escapes[c]);
   const plural = (count, one) => `${count} ${one}${count === 1 ? "" : "s"}`;
 
-  // ---- The model: LUNs with their paths, joined over all reports -------------------------------------------
+  // ---- The model: the LUNs of the documents, with their paths ----------------------------------------------
 
   const hosts = [];
   const luns = new Map(); // by identifier, or by host and device where there is none
   const paths = [];
 
-  function lunOf(key, label, facts) {
-    let lun = luns.get(key);
-    if (!lun) {
-      lun = { key, label, vendor: null, product: null, pseudoDevice: null, doubt: new Set(), paths: [], devices: new Set() };
-      luns.set(key, lun);
-    }
-    for (const field of ["vendor", "product", "pseudoDevice"]) {
-      lun[field] = lun[field] ?? facts[field] ?? null;
-    }
+  // A path is a device node of a host: the FC tree lists an adapter's LUNs once below each of its ports.
+  const pathCount = (list) => list.reduce((sum, entry) => sum + entry.pathCount, 0);
+
+  // Adds a LUN, which each host of `seenBy`, a list of {host, pathCount}, sees.
+  function addLun(key, label, seenBy, doubt) {
+    const lun = { key, label, vendor: null, product: null, pseudoDevice: null, seenBy, pathCount: pathCount(seenBy),
+      doubt: new Set(doubt), paths: [] };
+    luns.set(key, lun);
     return lun;
   }
 
+  // The documents say which paths lead to one LUN; a device that they count to none stands for itself.
+  function lunOf(host, { identifier, device }) {
+    const key = `device ${host.name} ${device}`;
+    return (identifier !== null && luns.get(`id ${identifier}`)) || luns.get(key) ||
+      addLun(key, device, [{ host: host.name, pathCount: 1 }]);
+  }
+
   function addPath(host, entry, kind, initiator, target, lunNumber) {
-    const known = entry.identifier !== null && entry.identifierKind !== "host-name";
-    const key = known ? `id ${entry.identifier}` : `device ${host.name} ${entry.device}`;
-    const lun = lunOf(key, known ? entry.identifier || "(empty)" : entry.device, entry);
+    const lun = lunOf(host, entry);
+    for (const field of ["vendor", "product", "pseudoDevice"]) {
+      lun[field] = lun[field] ?? entry[field] ?? null;
+    }
     const path = { host, kind, initiator, target, lun, device: entry.device, number: lunNumber };
     lun.paths.push(path);
-    lun.devices.add(`${host.name} ${entry.device}`);
     paths.push(path);
   }
 
+  const [first] = doc.reports;
+  const found = doc.san ? doc.san.luns : first.report.luns.map((lun) =>
+    ({ ...lun, hosts: [{ host: first.name, pathCount: lun.pathCount }], notUnique: lun.unique ? [] : [lun.notUnique] }));
+  for (const lun of found) {
+    addLun(`id ${lun.identifier}`, lun.identifier || "(empty)", lun.hosts, lun.notUnique);
+  }
   for (const { name, report } of doc.reports) {
     const host = { name, report, initiators: new Map() };
     hosts.push(host);
@@ -56,27 +68,13 @@
     for (const disk of report.direct.devices) {
       addPath(host, disk, "direct", "direct", "attached to the host", null);
     }
-    for (const lun of report.luns) {
-      if (!lun.unique) {
-        luns.get(`id ${lun.identifier}`)?.doubt.add(lun.notUnique);
-      }
-    }
-  }
-  for (const lun of doc.san?.luns ?? []) {
-    for (const reason of lun.notUnique) {
-      luns.get(`id ${lun.identifier}`)?.doubt.add(reason);
-    }
   }
   for (const lun of luns.values()) {
-    lun.hosts = [...new Set(lun.paths.map((path) => path.host))];
     lun.words = [lun.label, lun.vendor, lun.product, lun.pseudoDevice,
       ...lun.paths.flatMap((path) => [path.device, path.initiator, path.target, path.host.name])]
       .filter(Boolean).map((word) => word.toLowerCase());
     lun.words = [...new Set(lun.words)];
   }
-
-  // A path is a device node of a host: the FC tree lists an adapter's LUNs once below each of its ports.
-  const pathCount = (list) => list.reduce((sum, lun) => sum + lun.devices.size, 0);
 
   // ---- The picture -----------------------------------------------------------------------------------------
 
@@ -211,13 +209,13 @@
       box.luns.forEach((lun, i) => {
         const doubtful = lun.doubt.size ? " doubtful" : "";
         const node = { kind: "lun", lun, column: 3, find: lun.label, label: lun.label,
-          say: `LUN ${[lun.label, lun.vendor, lun.product].filter(Boolean).join(" ")}, ${plural(lun.devices.size, "path")}` };
+          say: `LUN ${[lun.label, lun.vendor, lun.product].filter(Boolean).join(" ")}, ${plural(lun.pathCount, "path")}` };
         lun.node = node;
         if (box.labelled) {
           node.y = box.y + 4 + i * rowHeight;
           out.push(`<g class="node lun${doubtful}" ${add(node)}><rect x="${x + 4}" y="${node.y + 1}" width="${w - 8}" height="${rowHeight - 2}" rx="3"/>` +
             `<text x="${x + 9}" y="${node.y + 14}">${esc(shorten(lun.label, w - 70))}</text>` +
-            `<text x="${x + w - 12}" y="${node.y + 14}" text-anchor="end">${plural(lun.devices.size, "path")}</text></g>`);
+            `<text x="${x + w - 12}" y="${node.y + 14}" text-anchor="end">${plural(lun.pathCount, "path")}</text></g>`);
         } else {
           node.y = box.y + 4 + Math.floor(i / squaresInRow) * (square + 2);
           out.push(`<rect class="lun${doubtful}" ${add(node)} x="${x + 5 + (i % squaresInRow) * (square + 2.8)}" y="${node.y}" width="${square}" height="${square}"/>`);
@@ -282,14 +280,14 @@
       out.push(table("hosts", "Hosts", ["Host", "Log", "LUNs", "Problems", "PowerPath", "Whole"], hosts.map(({ name, report }) =>
         `<tr><td>${finder(name)}</td><td>${esc(report.log.name)}</td><td class="number">${report.luns.length}</td><td class="number">${report.problems.filter((p) => p.severity === "problem").length}</td><td>${esc(report.multipath.powerPath)}</td><td>${report.log.complete ? "yes" : '<span class="bad">no</span>'}</td></tr>`)));
     }
-    const perHost = (lun) => lun.hosts.map((host) => `${host.name} ${new Set(lun.paths.filter((p) => p.host === host).map((p) => p.device)).size}`).join(", ");
+    const perHost = (lun) => lun.seenBy.map((seen) => `${seen.host} ${seen.pathCount}`).join(", ");
     let number = 0;
     out.push(table("luns", "LUNs", ["Identifier", "Product", "Pseudo device", "Paths", ...(many ? ["Paths of each host"] : []), "Remark"],
       [...luns.values()].map((lun) => {
         lun.row = `l${number++}`;
         const remark = [...lun.doubt].map((d) => `<span class="bad">not unique: ${esc(d)}</span>`).join("<br>") ||
-          (many && lun.hosts.length === 1 ? "one host only" : "");
-        return `<tr id="${lun.row}"><td class="key">${finder(lun.label)}</td><td>${esc([lun.vendor, lun.product].filter(Boolean).join(" "))}</td><td>${esc(lun.pseudoDevice)}</td><td class="number">${lun.devices.size}</td>${many ? `<td>${esc(perHost(lun))}</td>` : ""}<td>${remark}</td></tr>`;
+          (many && lun.seenBy.length === 1 ? "one host only" : "");
+        return `<tr id="${lun.row}"><td class="key">${finder(lun.label)}</td><td>${esc([lun.vendor, lun.product].filter(Boolean).join(" "))}</td><td>${esc(lun.pseudoDevice)}</td><td class="number">${lun.pathCount}</td>${many ? `<td>${esc(perHost(lun))}</td>` : ""}<td>${remark}</td></tr>`;
       })));
     number = 0;
     out.push(table("paths", "Listed paths", [...hostHead, "Device", "Over", "Initiator", "Target", "LUN", "Identifier"],
