@@ -181,16 +181,21 @@ int run(int argc, char** argv) {
         "morvane-view"};
     app.footer(kExamples);
     app.set_version_flag("--version", MORVANE_VERSION);
-    app.add_option("LOG", options.log, "the log to read, - for standard input")->capture_default_str();
+    CLI::Option* log = app.add_option("LOG", options.log, "the log to read, - for standard input");
+    log->capture_default_str();
     app.add_flag("--json", options.json, "write JSON instead of text");
-    app.add_option("--html", options.page, "write a page for the browser to FILE")->type_name("FILE");
+    CLI::Option* page = app.add_option("--html", options.page, "write a page for the browser to FILE");
+    page->type_name("FILE");
 
     CLI::App* diffCommand = app.add_subcommand("diff", "compare two logs of a host");
+    diffCommand->excludes(log);
+    diffCommand->excludes(page);
     diffCommand->add_option("OLD", options.before, "the earlier log")->required();
     diffCommand->add_option("NEW", options.after, "the later log")->required();
     diffCommand->add_flag("--json", options.json, "write JSON instead of text");
 
     CLI::App* sanCommand = app.add_subcommand("san", "show the logs of many hosts as one view");
+    sanCommand->excludes(log);
     sanCommand->add_option("LOG", options.logs, "the hosts' logs")->required();
     sanCommand->add_flag("--json", options.json, "write JSON instead of text");
     sanCommand->add_option("--html", options.page, "write a page for the browser to FILE")->type_name("FILE");

@@ -60,6 +60,8 @@ Cut cut(const std::string& log) {
     return seen;
 }
 
+const std::string kTrace = "Entered Function f Line 1\n";
+
 // As many lines as `count` says, none of which is known.
 std::string unknownLines(unsigned count) {
     std::string lines;
@@ -134,10 +136,10 @@ TEST(LogReader, HoldsOnlyTheTextsThatMayGoOn) {
     EXPECT_EQ(model.log.unknownPieces, 40);
 }
 
-TEST(LogReader, TakesForeignLinesBehindOpenEndedTextForParts) {
-    EXPECT_EQ(
-        cut("Buffer got = Pseudo name=emcpowera\nLogical device ID=6\nDisk name 'x\n\nLine: y\nwhat is this\n"),
-        (Cut{6, 2, 0, {{6, "what is this"}}}));
+TEST(LogReader, TakesEveryLineBehindOpenEndedTextForItsPartUpToATraceLine) {
+    EXPECT_EQ(cut("Buffer got = Pseudo name=emcpowera\nLogical device ID=6\nDisk name 'x\n\nGot ULID\n" +
+                  kTrace + "Line: y\nwhat is this\n"),
+              (Cut{8, 3, 0, {{8, "what is this"}}}));
 }
 
 TEST(LogReader, CountsUnknownPiecesAndKeepsTheFirstFive) {
@@ -202,6 +204,18 @@ TEST(LogReader, ReadsALogWhoseBeginningIsMissing) {
     EXPECT_TRUE(model.log.complete);
 }
 
+TEST(LogReader, EndsOpenEndedTextWhereTheNextRunBegins) {
+    const Model model = modelOf(kRunStart + "Buffer got = x\ny\n" + kRule + kRunStart + kDasBanner +
+                                diskLine("/dev/sda", "6") + kRunEnd);
+    EXPECT_EQ(disksOf(model), (Disks{{"/dev/sda", "6"}}));
+    EXPECT_EQ(model.log.runs, 2U);
+}
+
+TEST(LogReader, LeavesPiecesOfVendorAndProductThatHoldLineEndsUnknown) {
+    EXPECT_EQ(cut("Vendor AC\nME ProductId DISK\nTimeout\n9 ProductRev 1\n"),
+              (Cut{4, 1, 0, {{1, "Vendor AC"}, {2, "ME ProductId DISK"}, {4, "9 ProductRev 1"}}}));
+}
+
 TEST(LogReader, SaysTheSameWhateverTheChunks) {
     const std::string log =
         unknownLines(3) + kRunStart + "Line: aLine: bEntered Function f Line 1\nFound T10 Id: A\nB \n" +
@@ -227,13 +241,14 @@ TEST(LogReader, CutsALineBeyond16MiBAtOnePlaceWhateverTheChunks) {
 
 TEST(LogReader, NumbersTheLineWhereATextBegins) {
     const Model model =
-        modelOf(kRunStart + "Found T10 Id: A\n\nB \n--------> Device Name: |/dev/s\nr0| is not supported\n" +
+        modelOf(kRunStart + kDasBanner +
+                "Found T10 Id: A\n\nB \n--------> Device Name: |/dev/s\nr0| is not supported\n" +
                 "|ram0| is of no interest to us. Ignoring\n" + kRunEnd);
     std::vector<std::uint64_t> lines;
     for (const view::Problem& problem : model.problems) {
         lines.push_back(problem.line);
     }
-    EXPECT_EQ(lines, (std::vector<std::uint64_t>{5, 7}));
+    EXPECT_EQ(lines, (std::vector<std::uint64_t>{6, 8}));
 }
 
 TEST(LogReader, ReadsAStreamToItsEnd) {

@@ -85,8 +85,8 @@ TEST(Luns, LeaveOutWhatHasNoIdentifier) {
 }
 
 TEST(Luns, AreNotUniqueWithAnIdentifierThatTellsNothing) {
-    const Model model = modelOf(kDasBanner + diskLine("/dev/sda", "") + diskLine("/dev/sdb", "00 0") +
-                                diskLine("/dev/sdc", "01") + kRunEnd);
+    const Model model = modelOf(kRunStart + kDasBanner + diskLine("/dev/sda", "") +
+                                diskLine("/dev/sdb", "00 0") + diskLine("/dev/sdc", "01") + kRunEnd);
     EXPECT_EQ(
         reasonsOf(model),
         (Lines{"an empty identifier is none",
@@ -118,8 +118,8 @@ TEST(Luns, AreUniqueWithOneNumberAtEachTarget) {
 
 TEST(Luns, PutProblemsBeforeNotes) {
     const Model model =
-        modelOf(kDasBanner + "|ram0| is of no interest to us. Ignoring\n" + diskLine("/dev/sda", "0") +
-                "|ram1| is of no interest to us. Ignoring\n" + kRunEnd);
+        modelOf(kRunStart + kDasBanner + "|ram0| is of no interest to us. Ignoring\n" +
+                diskLine("/dev/sda", "0") + "|ram1| is of no interest to us. Ignoring\n" + kRunEnd);
     std::vector<std::string> subjects;
     for (const view::Problem& problem : model.problems) {
         subjects.push_back(problem.subject);

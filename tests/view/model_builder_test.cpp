@@ -49,7 +49,7 @@ Lines problemsOfRun(const std::string& texts) {
 
 TEST(ModelBuilder, JoinsThePartsOfAnFcPath) {
     const Model model = modelOf(
-        kFcBanner + kOpening + "Adapter info: Manufacturer ACME Model A 8 NumPorts=1\n" +
+        kRunStart + kFcBanner + kOpening + "Adapter info: Manufacturer ACME Model A 8 NumPorts=1\n" +
         "The number of targets is 1\nVendor DISKCO ProductId ARRAY 9 ProductRev 1.0\n" +
         identified("/dev/sdb", "6") + "Pseudo Device for Unique LunId 6 is emcpowera\n" + kAdapterLines +
         kTargetLine + lunLine("/dev/sdb", "6") + "Time taken to build tree: 12.50 milliseconds\n" + kRunEnd);
@@ -198,8 +198,7 @@ TEST(ModelBuilder, TellsWhatAnIgnoredIscsiDiskLacks) {
 }
 
 TEST(ModelBuilder, NotesASessionWithoutDisksOnce) {
-    EXPECT_EQ(problemsOfRun(kIscsiBanner + "Target IQN 'iqn.t'\nTarget IP '10.0.0.2'\n" + kIscsiBanner +
-                            kDasBanner),
+    EXPECT_EQ(problemsOfRun(kIscsiBanner + "Target IQN 'iqn.t'\nTarget IP '10.0.0.2'\n" + kDasBanner),
               Lines{"note, iscsi, iqn.t: the session to 10.0.0.2 has no disks, line 3"});
 }
 
@@ -216,6 +215,72 @@ TEST(ModelBuilder, KnowsADirectDiskByItsHostAndTheReason) {
     EXPECT_EQ(problemsOf(model),
               Lines{"note, direct, /dev/vda: known by the host's name only: the first INQUIRY failed "
                     "(errno 25, Inappropriate ioctl for device), line 8"});
+}
+
+// The log of a direct disk whose page 83h could not be read, for the reason in `texts`.
+std::string unreadDisk(const std::string& texts) {
+    return "Entered Function HA_GetScsiUniqueLunId Line 1\nGet LunID\n" + texts +
+           diskLine("/dev/sda", "db1::/dev/sda");
+}
+
+TEST(ModelBuilder, TakesADirectDiskThatACommandDoesNotReachForAProblem) {
+    const std::string known = "direct, /dev/sda: known by the host's name only: reading page 0x83 ";
+    EXPECT_EQ(problemsOfRun(kDasBanner + unreadDisk("Timeout\nTime-out in Reading VPD 0x83 Page\n")),
+              Lines{"problem, " + known + "timed out, line 7"});
+    EXPECT_EQ(problemsOfRun(kDasBanner + unreadDisk("ioctl failed, error code = 19\n\nSCSI Ioctl Failure for "
+                                                    "VPD 0x83 Page\n")),
+              Lines{"problem, " + known + "failed in the kernel (errno 19, No such device), line 8"});
+    EXPECT_EQ(problemsOfRun(kDasBanner + unreadDisk("TransportError: Category=4; Code=2;\nSCSI Error for VPD "
+                                                    "0x83 Inquiry\n")),
+              Lines{"problem, " + known + "ended with a SCSI error (the transport failed), line 7"});
+    EXPECT_EQ(problemsOfRun(kDasBanner + unreadDisk("Malformed VPD 0x83 Page\n")),
+              Lines{"note, direct, /dev/sda: known by the host's name only: page 0x83 is malformed, line 6"});
+}
+
+TEST(ModelBuilder, TellsTheKindOfAnIdentifierByTheDesignatorThatWasChosen) {
+    const auto kindOf = [](const std::string& found) {
+        const Model model =
+            modelOf(kDasBanner + "Entered Function HA_GetScsiUniqueLunId Line 1\n" + found +
+                    "Old Unique LunId = x, New Unique LunId = x\n" + diskLine("/dev/sda", "x") + kRunEnd);
+        return model.direct.devices.at(0).identifier.kind;
+    };
+    EXPECT_EQ(kindOf("Found T10 Id:  \nFound ScsiName ID: x \n"), view::IdentifierKind::ScsiName);
+    EXPECT_EQ(kindOf("Found T10 Id: y \nFound T10 Id:  \nFound MD5ID: x \n"), view::IdentifierKind::Md5);
+    EXPECT_EQ(kindOf("Found T10 Id: x \nFound Eui64Id: y \n"), view::IdentifierKind::T10);
+    EXPECT_EQ(kindOf("Found T10 Id: y \nFound NaaId:  \n"), view::IdentifierKind::Naa);
+}
+
+TEST(ModelBuilder, TakesAMissingBeginningForAProblem) {
+    EXPECT_EQ(
+        problemsOf(modelOf("Got ULID\n" + kDasBanner + diskLine("/dev/sda", "6") + kRunEnd)),
+        Lines{"problem, run, log: its beginning is missing: the report holds only what stands behind it, "
+              "line 1"});
+}
+
+TEST(ModelBuilder, TakesNoTextThatStandsInTheSectionOfAnother) {
+    const Model model = modelOf(kRunStart + kFcBanner + kOpening + diskLine("/dev/evil", "6") + kDasBanner +
+                                diskLine("/dev/sda", "7") + kFcBanner + kAdapterLines + kRunEnd);
+    EXPECT_EQ(
+        sectionOf(model, "direct"),
+        R"({"state":"built","devices":[{"device":"/dev/sda","identifier":"7","identifierKind":"unknown"}]})");
+    EXPECT_EQ(model.fc.adapters.size(), 1);
+    EXPECT_EQ(
+        problemsOf(model),
+        Lines{"problem, run, log: lines that look like Morvane's own stand where it does not write them (4 "
+              "in all): they are not taken; a device, a library or a command may have written them, line "
+              "4"});
+}
+
+TEST(ModelBuilder, TellsATreeThatIsNotConfiguredFromOneThatAnErrorEnded) {
+    const auto stateAfter = [](const std::string& texts) {
+        return modelOf(kRunStart + kIscsiBanner + texts + kRunEnd).iscsi.state;
+    };
+    const std::string stopped = "Cannot proceed with building ISCSI tree\n";
+    EXPECT_EQ(stateAfter("Failed to open /etc/iscsi/initiatorname.iscsi!\n" + stopped),
+              view::TreeState::NotConfigured);
+    EXPECT_EQ(stateAfter("Failed to open pipe for /sbin/iscsiadm!\n\n" + stopped), view::TreeState::Ended);
+    EXPECT_EQ(stateAfter("Caught exception while building ISCSI tree: no memory\n\n"),
+              view::TreeState::Ended);
 }
 
 TEST(ModelBuilder, TellsWhyADirectDeviceIsNotSupported) {

@@ -12,8 +12,9 @@ import unittest
 from pathlib import Path
 
 import make_log
-from support import HERE, HOSTS, PROGRAM, host_log, hosts, report, run, valid
+from support import HERE, HOSTS, PROGRAM, ROOT, host_log, hosts, report, run, valid
 
+PAGES = ROOT.parent / "shared" / "pages"  # of devices that others captured; not part of the project
 SIMHOST, MORVANE = (Path(argument).resolve() for argument in sys.argv[2:4])
 
 
@@ -39,6 +40,13 @@ class Hosts(unittest.TestCase):
                                  len(re.findall(rb"^--------> Device Name: \|.*\| LunId: \|.*\|$", log, re.M)))
                 self.assertEqual(len(document["logical"]["devices"]),
                                  len(re.findall(rb"^--------> Device Name: \|.*\| LunId: \|.*\| $", log, re.M)))
+
+
+class CapturedPages(unittest.TestCase):
+    @unittest.skipUnless(PAGES.is_dir(), f"no {PAGES}")
+    def test_are_read_as_their_own_check_says(self):
+        done = subprocess.run([PAGES / "check", MORVANE, SIMHOST, PROGRAM], capture_output=True, check=False, timeout=280)
+        self.assertRegex(done.stdout.decode().splitlines()[-1], r"^\d+ agreed, 0 differ$", done.stdout.decode())
 
 
 class Report(unittest.TestCase):
@@ -141,6 +149,27 @@ class Diff(unittest.TestCase):
         self.assertEqual([(c["before"], c["after"]) for c in document["pathCounts"]], [(4, 2)] * 3)
 
 
+    def test_a_tree_that_an_error_ended_is_said(self):
+        before = make_log.healthy().bytes()
+        start = before.index(b"Entered Function printDeviceTree")
+        end = before.index(b"Left Function BuildIscsiTree_Linux")
+        failure = b"Caught exception while building ISCSI tree: Write failed\n\n"
+        status, document = self.compare(before, before[:start] + failure + before[end:])
+        self.assertEqual((status, len(document["lostPaths"])), (1, 1))
+        self.assertEqual(document["warnings"], [
+            "the new log's ISCSI tree was ended early: what it does not list counts as lost"])
+
+    def test_two_hosts_are_told_apart_by_name_or_by_initiators(self):
+        one, other = make_log.healthy("one").bytes(), make_log.healthy("other").bytes()
+        self.assertEqual(self.compare(one, other)[1]["warnings"], ["the logs are of two hosts: one and other"])
+        self.assertEqual(self.compare(one, one)[1]["warnings"], [])
+        nameless = re.sub(rb"^--------> .*\n", b"", one, flags=re.M)
+        self.assertEqual(self.compare(one, nameless)[1]["warnings"], [])
+        foreign = nameless.replace(b"wwpn 10:00", b"wwpn 10:ff").replace(b"iqn.1993", b"iqn.2093")
+        self.assertEqual(self.compare(one, foreign)[1]["warnings"],
+                         ["the logs have no initiator in common: they may be of two hosts"])
+
+
 class San(unittest.TestCase):
     def test_luns_are_joined_over_hosts(self):
         with tempfile.TemporaryDirectory() as folder:
@@ -193,6 +222,18 @@ class Errors(unittest.TestCase):
                          (2, b"morvane-view: /nonexistent/log: No such file or directory\n"))
         self.assertEqual(run("diff", "/nonexistent/a", "/nonexistent/b").returncode, 2)
         self.assertEqual(run("--nonsense").returncode, 2)
+
+    def test_what_a_command_would_not_heed_is_refused(self):
+        with tempfile.TemporaryDirectory() as folder:
+            log = Path(folder, "log")
+            log.write_bytes(make_log.healthy().bytes())
+            for arguments in (["--html", "x.html", "diff", log, log], ["nosuch.log", "diff", log, log],
+                              ["nosuch.log", "san", log, log]):
+                done = run(*arguments, folder=folder)
+                self.assertEqual((done.returncode, done.stdout), (2, b""), arguments)
+                self.assertIn(b" excludes ", done.stderr)
+            self.assertEqual(run("--html", "x.html", "san", log, log, folder=folder).returncode, 0)
+            self.assertTrue(Path(folder, "x.html").exists())
 
 
 if __name__ == "__main__":

@@ -6,6 +6,8 @@
 
 #include <gtest/gtest.h>
 
+#include "view/read/foreign_texts.hpp"
+
 namespace {
 
 using view::KnownText;
@@ -22,7 +24,7 @@ const Found kUnending = {"unending"};
 
 Found match(const std::vector<KnownText>& texts, std::string_view bytes) {
     TextMatch found;
-    switch (TextMatcher(texts).match(bytes, found)) {
+    switch (TextMatcher(texts).match(bytes, bytes.size(), {}, found)) {
     case MatchResult::None:
         return kNone;
     case MatchResult::Unending:
@@ -62,7 +64,7 @@ TEST(TextMatcher, RecognisesEachKnownTextAsWhatItIs) {
     for (const KnownText& known : view::knownTexts()) {
         const std::string text = sample(known.format);
         TextMatch found;
-        ASSERT_EQ(matcher.match(text, found), MatchResult::Found) << text;
+        ASSERT_EQ(matcher.match(text, text.size(), {}, found), MatchResult::Found) << text;
         EXPECT_EQ(found.text, known.text) << text;
         EXPECT_EQ(found.length, text.size()) << text;
     }
@@ -123,9 +125,9 @@ TEST(TextMatcher, PrefersTheLongerOpening) {
 TEST(TextMatcher, PrefersTheTextWithALineEnd) {
     const std::vector<KnownText> texts = {{Text::Progress, "bad"}, {Text::RunEnd, "bad\n"}};
     TextMatch found;
-    EXPECT_EQ(TextMatcher(texts).match("bad", found), MatchResult::Found);
+    EXPECT_EQ(TextMatcher(texts).match("bad", 3, {}, found), MatchResult::Found);
     EXPECT_EQ(found.text, Text::RunEnd);
-    EXPECT_EQ(TextMatcher(texts).match("badly", found), MatchResult::Found);
+    EXPECT_EQ(TextMatcher(texts).match("badly", 5, {}, found), MatchResult::Found);
     EXPECT_EQ(found.text, Text::Progress);
 }
 

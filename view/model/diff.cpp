@@ -248,6 +248,34 @@ void compareLogical(Difference& difference, const Model& before, const Model& af
     std::transform(added.begin(), added.end(), std::back_inserter(difference.newLogical), device);
 }
 
+// The host's ends of its paths: port WWNs and IQNs.
+std::set<std::string_view> initiatorsOf(const Model& model) {
+    std::set<std::string_view> initiators;
+    for (const Adapter& adapter : model.fc.adapters) {
+        initiators.insert(adapter.initiators.begin(), adapter.initiators.end());
+    }
+    for (const IscsiPath& path : model.iscsi.paths) {
+        initiators.insert(path.initiatorIqn);
+    }
+    return initiators;
+}
+
+// Warns when the logs are of two hosts: by their names or, where a log has none, by their initiators.
+void compareHosts(Difference& difference, const Model& before, const Model& after) {
+    if (!before.host.empty() && !after.host.empty()) {
+        if (before.host != after.host) {
+            difference.warnings.push_back({DiffWarning::Kind::TwoHosts});
+        }
+        return;
+    }
+    const std::set<std::string_view> old = initiatorsOf(before);
+    const std::set<std::string_view> now = initiatorsOf(after);
+    const auto isCommon = [&](std::string_view initiator) { return now.contains(initiator); };
+    if (!old.empty() && !now.empty() && std::none_of(old.begin(), old.end(), isCommon)) {
+        difference.warnings.push_back({DiffWarning::Kind::NoCommonInitiator});
+    }
+}
+
 void addWarnings(Difference& difference, const Model& model, bool isOfNewLog) {
     const auto warn = [&](DiffWarning::Kind kind, Tree tree = Tree::Run, std::uint64_t pieces = 0) {
         difference.warnings.push_back({kind, isOfNewLog, tree, pieces});
@@ -256,8 +284,8 @@ void addWarnings(Difference& difference, const Model& model, bool isOfNewLog) {
         warn(DiffWarning::Kind::NotWhole);
     }
     for (const auto& [tree, state] :
-         {std::pair(Tree::Fc, model.fc.state), std::pair(Tree::Direct, model.direct.state),
-          std::pair(Tree::Logical, model.logical.state)}) {
+         {std::pair(Tree::Fc, model.fc.state), std::pair(Tree::Iscsi, model.iscsi.state),
+          std::pair(Tree::Direct, model.direct.state), std::pair(Tree::Logical, model.logical.state)}) {
         if (state == TreeState::Ended) {
             warn(DiffWarning::Kind::TreeEnded, tree);
         }
@@ -279,9 +307,7 @@ Difference compare(const Model& before, const Model& after) {
     Difference difference;
     difference.hostBefore = before.host;
     difference.hostAfter = after.host;
-    if (!before.host.empty() && !after.host.empty() && before.host != after.host) {
-        difference.warnings.emplace_back();
-    }
+    compareHosts(difference, before, after);
     addWarnings(difference, before, false);
     addWarnings(difference, after, true);
     comparePaths(difference, before, after);

@@ -43,9 +43,9 @@ struct DeviceDifference {
 
 // Why two logs may not compare well.
 struct DiffWarning {
-    enum class Kind : unsigned char { TwoHosts, NotWhole, TreeEnded, UnknownPieces };
+    enum class Kind : unsigned char { TwoHosts, NoCommonInitiator, NotWhole, TreeEnded, UnknownPieces };
     Kind kind = Kind::TwoHosts;
-    bool isOfNewLog = false;  // what is odd is the new log, not the old one; of TwoHosts, neither
+    bool isOfNewLog = false;  // of a single log: of the new one, not the old one
     Tree tree = Tree::Run;    // of TreeEnded
     std::uint64_t pieces = 0; // of UnknownPieces
 };

@@ -41,6 +41,7 @@ enum class ProblemKind : unsigned char {
     DeviceUnsupported,
     EntryIgnored,
     IdentifierNotUnique,
+    ForeignText,
 };
 
 struct Problem {
@@ -131,7 +132,8 @@ enum class TreeState : unsigned char {
     Absent, // the log has no such section
     Begun,  // the log ends inside it
     Built,
-    Ended, // by an error
+    Ended,         // by an error
+    NotConfigured, // the host is not set up for it, or does not let itself be asked
 };
 
 struct FcTree {

@@ -38,13 +38,14 @@ void DeviceSection::take(const TextMatch& match) {
 
 void DeviceSection::addDirect(const TextMatch& match) {
     DirectDevice direct{text(match.fields[0]), {text(match.fields[1]), mInquiry.chosen()}};
+    mInquiry.sayLineEnds(direct.device);
     const std::string ending = "::" + direct.device;
     if (direct.identifier.text.ends_with(ending)) {
         direct.identifier.kind = IdentifierKind::HostName;
         mDraft.model.host = direct.identifier.text.substr(0, direct.identifier.text.size() - ending.size());
         if (mInquiry.hasFailed()) {
-            mDraft.problem(Severity::Note, ProblemKind::InquiryFailed, direct.device,
-                           "known by the host's name only: " + mInquiry.cause(direct.device));
+            mDraft.problem(mInquiry.isLost() ? Severity::Problem : Severity::Note, ProblemKind::InquiryFailed,
+                           direct.device, "known by the host's name only: " + mInquiry.cause(direct.device));
         }
     }
     mInquiry.begin();
@@ -62,6 +63,7 @@ void DeviceSection::addLogical(const TextMatch& match) {
 }
 
 void DeviceSection::addUnsupported(std::string_view device) {
+    mInquiry.sayLineEnds(text(device));
     mDraft.problem(mInquiry.isOfWrongType() ? Severity::Note : Severity::Problem,
                    ProblemKind::DeviceUnsupported, text(device), "not reported: " + mInquiry.cause(device));
 }

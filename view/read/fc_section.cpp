@@ -147,6 +147,7 @@ void FcSection::takeTree(const TextMatch& match) {
 void FcSection::addIdentified(const TextMatch& match) {
     OpenAdapter& opened = open();
     const std::string& device = mInquiry.device();
+    mInquiry.sayLineEnds(device);
     UnlistedLun lun{device, {text(match.fields[0]), mInquiry.chosen()}, {}};
     if (opened.identityPass > 0 && opened.identityPass <= opened.vendorPass.size()) {
         lun.facts = opened.vendorPass[opened.identityPass - 1];
@@ -182,6 +183,7 @@ void FcSection::addListed(const TextMatch& match) {
 }
 
 void FcSection::drop(const std::string& device) {
+    mInquiry.sayLineEnds(device);
     std::string subject = device;
     if (const auto found = open().lunAndTarget.find(device); found != open().lunAndTarget.end()) {
         subject +=
@@ -191,6 +193,7 @@ void FcSection::drop(const std::string& device) {
 }
 
 void FcSection::abandon() {
+    mInquiry.sayLineEnds(mInquiry.device());
     const OpenAdapter& opened = open();
     const std::vector<DeviceFacts>& vendors = opened.vendorPass;
     Adapter& failed = adapter();
@@ -232,11 +235,12 @@ void FcSection::close() {
     }
     mOpen.reset();
     mCause.clear();
-    mInquiry = {};
+    mInquiry.begin();
+    mInquiry.setDevice({});
 }
 
 // The record of the adapter that the texts are about; a fresh one, and an adapter, when none is open.
-FcSection::OpenAdapter& FcSection::open() {
+OpenAdapter& FcSection::open() {
     if (!mOpen) {
         mOpen.emplace();
         mDraft.model.fc.adapters.emplace_back();

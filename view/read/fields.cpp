@@ -2,6 +2,12 @@
 
 namespace view {
 
+unsigned hexToNumber(std::string_view digits) {
+    unsigned number = 0;
+    std::from_chars(digits.data(), digits.data() + digits.size(), number, 16);
+    return number;
+}
+
 std::string text(std::string_view field) {
     return std::string(field);
 }

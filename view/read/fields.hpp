@@ -17,6 +17,9 @@ Number toNumber(std::string_view digits) {
     return error == std::errc::result_out_of_range ? std::numeric_limits<Number>::max() : number;
 }
 
+// The number that a field's hexadecimal digits stand for; 0 when it is too great.
+unsigned hexToNumber(std::string_view digits);
+
 // A field's bytes, as their owner.
 std::string text(std::string_view field);
 

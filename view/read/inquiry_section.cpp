@@ -1,9 +1,9 @@
 #include "view/read/inquiry_section.hpp"
 
+#include <cerrno>
 #include <system_error>
 #include <utility>
 
-#include "view/read/draft.hpp"
 #include "view/read/fields.hpp"
 
 namespace view {
@@ -38,6 +38,11 @@ std::string errorName(int number) {
     return "errno " + std::to_string(number) + ", " + std::system_category().message(number);
 }
 
+// Whether the device of an SG_IO that failed with this errno has the call at all.
+bool speaksScsi(int error) {
+    return error != ENOTTY && error != EINVAL && error != ENOSYS && error != EOPNOTSUPP;
+}
+
 } // namespace
 
 void InquirySection::take(const TextMatch& match) {
@@ -55,20 +60,23 @@ void InquirySection::take(const TextMatch& match) {
     case Text::InquiryPage:
         mAnswers.pageAsked = true;
         break;
-    case Text::FoundNaa:
+    case Text::Designator:
+        mAnswers.lineEnds = mAnswers.lineEnds || match.fields[2].find('\n') != std::string_view::npos;
+        break;
+    case Text::FoundNaa: // chosen whatever it is
         mAnswers.found.insert(IdentifierKind::Naa);
         break;
     case Text::FoundT10:
-        mAnswers.found.insert(IdentifierKind::T10);
+        find(IdentifierKind::T10, match.fields[0]);
         break;
     case Text::FoundEui64:
-        mAnswers.found.insert(IdentifierKind::Eui64);
+        find(IdentifierKind::Eui64, match.fields[0]);
         break;
     case Text::FoundMd5:
-        mAnswers.found.insert(IdentifierKind::Md5);
+        find(IdentifierKind::Md5, match.fields[0]);
         break;
     case Text::FoundScsiName:
-        mAnswers.found.insert(IdentifierKind::ScsiName);
+        find(IdentifierKind::ScsiName, match.fields[0]);
         break;
     case Text::ChosenId: // the enumerators stand in the order of preference
         mAnswers.chosen = mAnswers.found.empty() ? IdentifierKind::Unknown : *mAnswers.found.begin();
@@ -129,12 +137,15 @@ void InquirySection::takeScsi(const TextMatch& match) {
         break;
     case Text::ScsiTransport:
         detail = "the transport failed";
+        mAnswers.lost = true;
         break;
     case Text::ScsiTimeOut:
         detail = kTimedOut;
+        mAnswers.lost = true;
         break;
     case Text::ScsiIoctl:
         detail = errorName(toNumber<int>(match.fields[0]));
+        mAnswers.lost = mAnswers.lost || speaksScsi(toNumber<int>(match.fields[0]));
         break;
     case Text::ScsiInvalidOpcode:
         detail = "ILLEGAL REQUEST, invalid opcode";
@@ -144,6 +155,25 @@ void InquirySection::takeScsi(const TextMatch& match) {
         break;
     default:
         break;
+    }
+}
+
+// Notes a designator of one kind; a later one takes the place of the one before, and an empty one is never
+// chosen.
+void InquirySection::find(IdentifierKind kind, std::string_view designator) {
+    if (designator.empty()) {
+        mAnswers.found.erase(kind);
+    } else {
+        mAnswers.found.insert(kind);
+    }
+}
+
+void InquirySection::sayLineEnds(const std::string& device) {
+    if (mAnswers.lineEnds) {
+        mDraft->problem(Severity::Problem, ProblemKind::ForeignText, device,
+                        "a designator of its page 0x83 holds a line end; what follows it in the log may look "
+                        "like Morvane's own lines, but is the device's and not taken for them");
+        mAnswers.lineEnds = false;
     }
 }
 

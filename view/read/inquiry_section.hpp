@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "view/model/model.hpp"
+#include "view/read/draft.hpp"
 #include "view/read/text_matcher.hpp"
 
 namespace view {
@@ -14,11 +15,17 @@ namespace view {
 // the identifier came from.
 class InquirySection {
 public:
+    explicit InquirySection(Draft& draft) : mDraft(&draft) {}
+
     // Takes a text of Section::Inquiry.
     void take(const TextMatch& match);
 
     // Forgets everything but the device: the next identification begins.
     void begin() { mAnswers = {}; }
+
+    // Says that the designators of a device hold line ends, if they do. For where the log names a device only
+    // behind its identification.
+    void sayLineEnds(const std::string& device);
 
     // Names the device that is being identified; empty when the log does not tell.
     void setDevice(std::string_view device) { mDevice = device; }
@@ -33,6 +40,10 @@ public:
     // Whether something failed, and not just a page is missing that not every device has.
     [[nodiscard]] bool hasFailed() const { return mAnswers.failed; }
 
+    // Whether a command did not come through to the device: a time-out, a transport or the kernel failed. A
+    // device that does not speak SCSI is none of these.
+    [[nodiscard]] bool isLost() const { return mAnswers.lost; }
+
     // Whether the device was turned away by its type: without a word, and before page 0x83 was asked for.
     [[nodiscard]] bool isOfWrongType() const { return !hasCause() && !mAnswers.pageAsked; }
 
@@ -46,13 +57,17 @@ private:
         std::string detail; // of the command under way: why it failed
         bool pageAsked = false;
         bool failed = false;
+        bool lost = false;
+        bool lineEnds = false; // in a designator
         std::set<IdentifierKind> found;
         IdentifierKind chosen = IdentifierKind::Unknown;
     };
 
+    void find(IdentifierKind kind, std::string_view designator);
     void takeScsi(const TextMatch& match);
     void fail(std::string_view words, bool isFailure = true);
 
+    Draft* mDraft;
     std::string mDevice;
     Answers mAnswers;
 };

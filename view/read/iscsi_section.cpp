@@ -33,6 +33,7 @@ void IscsiSection::take(const TextMatch& match) {
         addSession(text(first));
         break;
     case Text::IscsiRegister:
+        mInquiry.sayLineEnds(mInquiry.device());
         mRegistered = {text(first),
                        text(match.fields[1]),
                        text(match.fields[2]),
@@ -112,7 +113,7 @@ void IscsiSection::stop() {
         mDraft.endTree(Tree::Iscsi, mCause);
         return;
     }
-    mDraft.model.iscsi.state = TreeState::Ended;
+    mDraft.model.iscsi.state = TreeState::NotConfigured;
     mDraft.problem(
         Severity::Note, ProblemKind::IscsiNotConfigured, "ISCSI",
         "/etc/iscsi/initiatorname.iscsi cannot be read: no open-iscsi on this host, or no permission; "

@@ -16,7 +16,7 @@ namespace view {
 class IscsiSection {
 public:
     // `inquiry` holds what is known of the disk that is being identified.
-    IscsiSection(Draft& draft, const InquirySection& inquiry) : mDraft(draft), mInquiry(inquiry) {}
+    IscsiSection(Draft& draft, InquirySection& inquiry) : mDraft(draft), mInquiry(inquiry) {}
 
     // Takes a text of Section::Iscsi.
     void take(const TextMatch& match);
@@ -41,7 +41,7 @@ private:
     [[nodiscard]] std::string ignoredCause() const;
 
     Draft& mDraft;
-    const InquirySection& mInquiry;
+    InquirySection& mInquiry;
     std::vector<Session> mSessions;
     std::string mCause;    // why the tree was not begun
     IscsiPath mAbove;      // fields of the lines above a device line

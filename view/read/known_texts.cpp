@@ -213,8 +213,8 @@ constexpr auto kTable = std::to_array<KnownText>({
     // INQUIRY.
     {Text::Progress, "Going to create the Inquiry command\n"},
     {Text::Progress, "SCSI Inquiry CDB Dump:"},
-    {Text::Progress, "Going to dump %u bytes\n"},
-    {Text::Progress, "Byte %u: 0x%x"},
+    {Text::Dump, "Going to dump %u bytes\n"},
+    {Text::DumpByte, "Byte %u: 0x%x"},
     {Text::Progress, "lcAllocLength = %u\n"},
     {Text::Progress, "Got a scsi inquiry response\n"},
     {Text::ScsiStatus, "GotStatus:Category=%u; Code=%u;\n", Section::Inquiry},
@@ -251,9 +251,9 @@ constexpr auto kTable = std::to_array<KnownText>({
     {Text::Progress, "Device Identification Data is malformed\n"},
     {Text::Progress, "Going to Extract Data from Descriptor @ %u\n"},
     {Text::Progress, "Going to store identifier in Binary format\n"},
-    {Text::Progress, "Going to store identifier in ASCII format\n"},
+    {Text::AsciiDesignator, "Going to store identifier in ASCII format\n"},
     {Text::Progress, "Identifier format is undefined.\n"},
-    {Text::Progress, "ID Type: 0%x; Association type: 0%x; Identifier: '%s'\n"},
+    {Text::Designator, "ID Type: 0%x; Association type: 0%x; Identifier: '%s'\n", Section::Inquiry},
 });
 
 } // namespace

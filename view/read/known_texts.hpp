@@ -21,7 +21,10 @@ enum class Section : unsigned char {
 // needs.
 enum class Text : unsigned char {
     Progress,
-    OpenEnded, // progress whose last field is foreign text that may run over several lines
+    OpenEnded,       // progress whose last field is foreign text: it runs up to the next trace line
+    Dump,            // the bytes of a dump follow
+    DumpByte,        // number, value
+    AsciiDesignator, // the bytes just dumped are a descriptor, shown as text from here on
     TraceEntry,
     TraceExit,
 
@@ -94,6 +97,7 @@ enum class Text : unsigned char {
     InquiryOpenFailed,
     InquiryTypeFailed,
     InquiryPage,
+    Designator,
     FoundNaa,
     FoundT10,
     FoundEui64,
@@ -127,7 +131,7 @@ enum class Text : unsigned char {
 struct KnownText {
     Text text;
     std::string_view format;
-    Section section = Section::Any; // of Progress and OpenEnded, which no part reads
+    Section section = Section::Any; // of texts that no part of the model needs
 };
 
 // Every text Morvane writes, in no particular order.

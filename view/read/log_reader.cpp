@@ -29,6 +29,12 @@ bool isTrace(std::string_view line) {
                        [line](std::string_view beginning) { return line.starts_with(beginning); });
 }
 
+// Whether open-ended foreign text stops before a line: Morvane goes on with its trace, and a further run in
+// the same file with its first banner.
+bool endsOpenText(std::string_view line) {
+    return isTrace(line) || line == "\t\tCheck for Multipath software";
+}
+
 // Where, behind its first byte, the last trace line on `line` may begin; the end of `line` if nowhere. A
 // trace line goes on to the end of its line, so no other one matters.
 std::size_t findTrace(std::string_view line) {
@@ -83,6 +89,7 @@ Model LogReader::finish() {
     if (!mPartialLine.empty()) {
         takeLine(std::exchange(mPartialLine, {}));
     }
+    mForeign = {}; // nothing of them is to come
     takeTexts(mHeld, false);
     mFacts.cutInLine = mIsInLine;
     mFacts.lines = mLine - (mIsInLine ? 0 : 1);
@@ -93,8 +100,8 @@ Model LogReader::finish() {
 
 // Takes a line with its line end, or holds it.
 void LogReader::takeLine(std::string_view line) {
-    if (isTrace(line)) { // the rest of a held text never comes
-        takeTexts(std::exchange(mHeld, {}), false);
+    if (isTrace(line) && !mInForeign) { // the rest of a held text never comes
+        mHeld.erase(0, takeTexts(mHeld, false));
     }
     if (mHeld.empty()) {
         mHeld = line.substr(takeTexts(line, true));
@@ -104,30 +111,42 @@ void LogReader::takeLine(std::string_view line) {
     }
 }
 
-// Cuts `bytes`, which end with a line, into texts and hands them on. With `mayWait`, stops before a text that
-// may go on behind them. Returns the number of bytes taken.
+// Cuts `bytes`, which end with a line, into texts and hands them on. Stops before a text that ends inside a
+// foreign one and, with `mayWait`, before a text that may go on behind the bytes. Returns the number of bytes
+// taken.
 std::size_t LogReader::takeTexts(std::string_view bytes, bool mayWait) {
+    mInForeign = false;
     std::size_t at = 0;
     while (at < bytes.size()) {
         std::size_t lineEnd = std::min(bytes.find('\n', at), bytes.size());
+        mInOpenText = mInOpenText && !endsOpenText(bytes.substr(at, lineEnd - at));
+        if (mInOpenText) {
+            mFacts.knownBytes += lineEnd - at;
+            mIsInLine = mIsInLine || at < lineEnd;
+            at = lineEnd;
+        }
         while (at < lineEnd) {
-            const std::string_view line = bytes.substr(at, lineEnd - at);
+            const std::string_view rest = bytes.substr(at);
             TextMatch match;
-            MatchResult result = matcher().match(line, match);
-            if (result == MatchResult::Unending && (mIsInLine || !mInOpenText)) {
-                const std::string_view lines = bytes.substr(at);
-                if (mayWait && mayGoOn(lines)) {
+            MatchResult result = matcher().match(rest, lineEnd - at, mForeign, match);
+            if (result == MatchResult::Unending) {
+                if (mayWait && mayGoOn(rest)) {
                     return at;
                 }
-                result = matcher().match(lines, match);
+                result = matcher().match(rest, rest.size(), mForeign, match);
+            }
+            if (result == MatchResult::Cut) {
+                mInForeign = true;
+                return at;
             }
             if (result == MatchResult::Found) {
-                takeKnown(match, bytes.substr(at, match.length));
+                takeKnown(match, rest.substr(0, match.length));
                 at += match.length;
                 if (at > lineEnd) {
                     lineEnd = std::min(bytes.find('\n', at), bytes.size());
                 }
             } else {
+                const std::string_view line = bytes.substr(at, lineEnd - at);
                 const std::string_view unknown = line.substr(0, findTrace(line));
                 takeUnknown(unknown);
                 at += unknown.size();
@@ -146,6 +165,7 @@ void LogReader::takeKnown(const TextMatch& match, std::string_view bytes) {
     mFacts.gluedTexts += mIsInLine ? 1 : 0;
     mFacts.knownBytes += bytes.size();
     mInOpenText = match.text == Text::OpenEnded;
+    mForeign.take(match);
     mBuilder.take(match, mLine);
     mLine += static_cast<std::uint64_t>(lineEndsIn(bytes));
     mIsInLine = true;
@@ -153,10 +173,6 @@ void LogReader::takeKnown(const TextMatch& match, std::string_view bytes) {
 
 void LogReader::takeUnknown(std::string_view bytes) {
     mIsInLine = true;
-    if (mInOpenText) {
-        mFacts.knownBytes += bytes.size();
-        return;
-    }
     mFacts.unknownBytes += bytes.size();
     ++mFacts.unknownPieces;
     if (mFacts.unknownSamples.size() < kMaximumSamples) {

@@ -7,6 +7,7 @@
 #include <string_view>
 
 #include "view/model/model.hpp"
+#include "view/read/foreign_texts.hpp"
 #include "view/read/model_builder.hpp"
 #include "view/read/text_matcher.hpp"
 
@@ -32,12 +33,14 @@ private:
     void takeLineEnd();
 
     ModelBuilder mBuilder;
+    ForeignTexts mForeign;
     LogFacts mFacts;
     std::string mPartialLine; // the beginning of a line whose end has not come yet
     std::string mHeld;        // lines whose first text may go on in the next one
     std::uint64_t mLine = 1;  // number of the line that is being cut into texts
     bool mIsInLine = false;   // behind the first byte of that line
-    bool mInOpenText = false; // behind foreign text that may run over several lines
+    bool mInOpenText = false; // behind foreign text that runs up to the next trace line
+    bool mInForeign = false;  // the lines held end inside a foreign text
 };
 
 // Reads a whole stream.

@@ -8,6 +8,34 @@
 
 namespace view {
 
+namespace {
+
+// Whether a part of the program writes in the section of a tree. In a log whose beginning is missing the
+// section is not known before the first banner.
+bool writesIn(Section part, Tree tree) {
+    if (tree == Tree::Run) {
+        return true;
+    }
+    switch (part) {
+    case Section::Multipath:
+        return tree == Tree::Multipath;
+    case Section::Fc:
+        return tree == Tree::Fc;
+    case Section::Iscsi:
+        return tree == Tree::Iscsi;
+    case Section::Direct:
+        return tree == Tree::Direct;
+    case Section::Logical:
+        return tree == Tree::Logical;
+    case Section::Inquiry:
+        return tree == Tree::Fc || tree == Tree::Iscsi || tree == Tree::Direct;
+    default:
+        return true;
+    }
+}
+
+} // namespace
+
 void ModelBuilder::take(const TextMatch& match, std::uint64_t line) {
     mRun->draft.line = line;
     if (match.section == Section::Any) {
@@ -30,6 +58,10 @@ void ModelBuilder::take(const TextMatch& match, std::uint64_t line) {
     }
     if (mRun->ended) {
         ++mLeftoverTexts;
+        return;
+    }
+    if (!writesIn(match.section, mRun->draft.tree)) {
+        misplace();
         return;
     }
     switch (match.section) {
@@ -70,6 +102,19 @@ Model ModelBuilder::finish(LogFacts facts) {
                     "was cut off");
         }
     }
+    if (mRuns == 0) {
+        draft.model.problems.push_back(
+            {Severity::Problem, ProblemKind::LogCut, Tree::Run, "log",
+             "its beginning is missing: the report holds only what stands behind it", 1});
+    }
+    if (mRun->misplacedTexts > 0) {
+        draft.model.problems.push_back(
+            {Severity::Problem, ProblemKind::ForeignText, Tree::Run, "log",
+             "lines that look like Morvane's own stand where it does not write them (" +
+                 std::to_string(mRun->misplacedTexts) +
+                 " in all): they are not taken; a device, a library or a command may have written them",
+             mRun->firstMisplaced});
+    }
     facts.runs = mRuns;
     facts.beginsInside = mRuns == 0;
     facts.complete = mRun->ended;
@@ -86,6 +131,13 @@ void ModelBuilder::beginRun() {
     mRun.emplace();
     mRun->draft.line = line;
     mRun->draft.tree = Tree::Multipath;
+}
+
+// Notes a text that is not taken because of its place.
+void ModelBuilder::misplace() {
+    if (mRun->misplacedTexts++ == 0) {
+        mRun->firstMisplaced = mRun->draft.line;
+    }
 }
 
 void ModelBuilder::takeFrame(const TextMatch& match) {
@@ -152,6 +204,10 @@ void ModelBuilder::takeTreeEnd(const TextMatch& match) {
 }
 
 void ModelBuilder::enterTree(Tree tree) {
+    if (tree <= mRun->draft.tree) { // each has its turn once
+        misplace();
+        return;
+    }
     leaveTree();
     mRun->draft.tree = tree;
     mRun->draft.stateOf(tree) = TreeState::Begun;

@@ -31,16 +31,19 @@ private:
     // One run of the program: its model, and a reader of each section.
     struct Run {
         Draft draft;
-        InquirySection inquiry;
+        InquirySection inquiry{draft};
         MultipathSection multipath{draft};
         FcSection fc{draft, inquiry};
         IscsiSection iscsi{draft, inquiry};
         DeviceSection devices{draft, inquiry};
+        std::uint64_t misplacedTexts = 0; // that their part does not write in the section they stand in
+        std::uint64_t firstMisplaced = 0; // the line of the first
         bool ended = false;
         bool asserted = false;
     };
 
     void beginRun();
+    void misplace();
     void takeFrame(const TextMatch& match);
     void takeInquiry(const TextMatch& match);
     void takeTreeEnd(const TextMatch& match);

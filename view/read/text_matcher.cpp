@@ -2,6 +2,8 @@
 
 #include <algorithm>
 
+#include "view/read/foreign_texts.hpp"
+
 namespace view {
 
 namespace {
@@ -61,6 +63,37 @@ std::size_t runEnd(std::string_view bytes, std::size_t from, Accepts accepts) {
 }
 
 } // namespace
+
+// The bytes in which a text may stand: up to a line end, which a foreign text moves behind itself.
+class TextMatcher::Reach {
+public:
+    Reach(std::string_view all, std::size_t end, const ForeignTexts& foreign)
+        : mAll(all), mEnd(std::min(end, all.size())), mForeign(foreign) {}
+
+    [[nodiscard]] std::string_view bytes() const { return mAll.substr(0, mEnd); }
+
+    // The place behind the foreign text that begins at `at`; `at` when there is none.
+    std::size_t behindForeign(std::size_t at) {
+        const std::size_t length = mForeign.lengthAt(mAll.substr(at));
+        if (length == ForeignTexts::kUnending) {
+            mIsCut = true;
+            return at;
+        }
+        if (at + length > mEnd) {
+            mEnd = std::min(mAll.find('\n', at + length), mAll.size());
+        }
+        return at + length;
+    }
+
+    // Whether a foreign text may go on behind the bytes.
+    [[nodiscard]] bool isCut() const { return mIsCut; }
+
+private:
+    std::string_view mAll;
+    std::size_t mEnd;
+    const ForeignTexts& mForeign;
+    bool mIsCut = false;
+};
 
 TextMatcher::TextMatcher(std::span<const KnownText> texts) : mPatternsByFirstByte(256) {
     for (const KnownText& known : texts) {
@@ -126,7 +159,8 @@ TextMatcher::Piece TextMatcher::takePiece(std::string_view& format) {
     return piece;
 }
 
-MatchResult TextMatcher::match(std::string_view bytes, TextMatch& match) const {
+MatchResult TextMatcher::match(std::string_view bytes, std::size_t reach, const ForeignTexts& foreign,
+                               TextMatch& match) const {
     if (bytes.empty()) {
         return MatchResult::None;
     }
@@ -136,8 +170,10 @@ MatchResult TextMatcher::match(std::string_view bytes, TextMatch& match) const {
         if (!bytes.starts_with(opening)) {
             continue;
         }
-        if (matchPattern(pattern, bytes, match)) {
-            return MatchResult::Found;
+        Reach attempt(bytes, reach, foreign);
+        const bool isFound = matchPattern(pattern, attempt, match);
+        if (isFound || attempt.isCut()) {
+            return attempt.isCut() ? MatchResult::Cut : MatchResult::Found;
         }
         if (pattern.mayRunOver && opening.size() >= kShortestOpening) {
             result = MatchResult::Unending;
@@ -148,29 +184,31 @@ MatchResult TextMatcher::match(std::string_view bytes, TextMatch& match) const {
 
 // A text field ends at the first place behind which the pieces up to the next text field fit. No other end is
 // tried when those behind them do not fit: what is not there behind one place is not there behind a later
-// one. So the work grows with the bytes, whatever they are.
-bool TextMatcher::matchPattern(const Pattern& pattern, std::string_view bytes, TextMatch& match) {
+// one. So the work grows with the bytes, whatever they are. What is known to be foreign at the beginning of a
+// field is not searched.
+bool TextMatcher::matchPattern(const Pattern& pattern, Reach& reach, TextMatch& match) {
     match.text = pattern.text;
     match.section = pattern.section;
     match.fieldCount = 0;
     Position position;
-    if (!matchUpToText(pattern, bytes, position, match)) {
+    if (!matchUpToText(pattern, reach, position, match)) {
         return false;
     }
     while (position.piece < pattern.pieces.size()) {
         const std::string_view next = pattern.pieces[position.piece].literal;
         const std::size_t start = position.at;
         const std::size_t slot = match.fieldCount;
-        const std::string_view reach = bytes.substr(0, start + kLongestField + next.size());
+        const std::size_t searched = reach.behindForeign(start);
+        const std::string_view bytes = reach.bytes().substr(0, start + kLongestField + next.size());
         Position behind;
-        for (std::size_t end = reach.find(next, start);; end = reach.find(next, end + 1)) {
+        for (std::size_t end = bytes.find(next, searched);; end = bytes.find(next, end + 1)) {
             if (end == std::string_view::npos) {
                 return false;
             }
             match.fields.at(slot) = bytes.substr(start, end - start);
             match.fieldCount = slot + 1;
             behind = {position.piece, end};
-            if (matchUpToText(pattern, bytes, behind, match)) {
+            if (matchUpToText(pattern, reach, behind, match)) {
                 break;
             }
         }
@@ -182,12 +220,11 @@ bool TextMatcher::matchPattern(const Pattern& pattern, std::string_view bytes, T
 
 // Matches the pieces at `position` and moves it behind them: to the start of the next text field that a piece
 // follows, or to the end of the text.
-bool TextMatcher::matchUpToText(const Pattern& pattern, std::string_view bytes, Position& position,
-                                TextMatch& match) {
+bool TextMatcher::matchUpToText(const Pattern& pattern, Reach& reach, Position& position, TextMatch& match) {
     auto& [piece, at] = position;
     while (piece < pattern.pieces.size()) {
         const auto& [literal, field] = pattern.pieces[piece];
-        if (!bytes.substr(at).starts_with(literal)) {
+        if (!reach.bytes().substr(at).starts_with(literal)) {
             return false;
         }
         at += literal.size();
@@ -196,25 +233,27 @@ bool TextMatcher::matchUpToText(const Pattern& pattern, std::string_view bytes, 
             return true;
         }
         if (field != Field::None) {
-            const std::size_t end = fieldEnd(pattern, field, bytes, at);
+            const std::size_t end = fieldEnd(pattern, field, reach, at);
             if (end == std::string_view::npos) {
                 return false;
             }
-            match.fields.at(match.fieldCount++) = bytes.substr(at, end - at);
+            match.fields.at(match.fieldCount++) = reach.bytes().substr(at, end - at);
             at = end;
         }
     }
+    const std::string_view bytes = reach.bytes();
     return !pattern.endsLine || at == bytes.size() || bytes[at] == '\n';
 }
 
 // The end of the field at `at`, which is no text field that a piece follows; npos when there is no such
 // field.
-std::size_t TextMatcher::fieldEnd(const Pattern& pattern, Field field, std::string_view bytes,
-                                  std::size_t at) {
+std::size_t TextMatcher::fieldEnd(const Pattern& pattern, Field field, Reach& reach, std::size_t at) {
+    const std::size_t searched = field == Field::Text ? reach.behindForeign(at) : at;
+    const std::string_view bytes = reach.bytes();
     std::size_t end = at;
     switch (field) {
     case Field::Text:
-        end = pattern.endsLine ? findLineEnd(bytes, at) : findFollower(pattern.text, bytes, at);
+        end = pattern.endsLine ? findLineEnd(bytes, searched) : findFollower(pattern.text, bytes, searched);
         return end - at <= kLongestField ? end : std::string_view::npos;
     case Field::Decimal:
         end = runEnd(bytes, at + (bytes.substr(at).starts_with('-') ? 1 : 0), isDecimal);

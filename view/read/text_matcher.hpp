@@ -25,17 +25,23 @@ enum class MatchResult : unsigned char {
     None,     // no known text starts here
     Unending, // a text with a field of foreign bytes starts here, but its rest is missing: the field may hold
               // a line end, so the text may go on in the next line
+    Cut,      // a text starts here whose field begins with a foreign text that goes on behind the bytes
     Found,
 };
+
+class ForeignTexts;
 
 // Recognises Morvane's log texts by their printf formats.
 class TextMatcher {
 public:
     explicit TextMatcher(std::span<const KnownText> texts);
 
-    // Looks for a known text at the start of `bytes`, which hold one line of the log, or several when a field
-    // may go over a line end. Fills `match` when the result is Found.
-    [[nodiscard]] MatchResult match(std::string_view bytes, TextMatch& match) const;
+    // Looks for a known text at the start of `bytes`. It stands in their first `reach` bytes, which are a
+    // line of the log, or several when a field may go over a line end; but a field that begins with one of
+    // `foreign` holds all of it and goes on from there to the end of a line. Fills `match` when the result is
+    // Found.
+    MatchResult match(std::string_view bytes, std::size_t reach, const ForeignTexts& foreign,
+                      TextMatch& match) const;
 
 private:
     enum class Field : unsigned char { None, Text, Decimal, Hex, Real, Pointer };
@@ -60,12 +66,13 @@ private:
         std::size_t at = 0; // in the bytes
     };
 
+    class Reach;
+
     static Pattern compile(const KnownText& known);
     static Piece takePiece(std::string_view& format);
-    static bool matchPattern(const Pattern& pattern, std::string_view bytes, TextMatch& match);
-    static bool matchUpToText(const Pattern& pattern, std::string_view bytes, Position& position,
-                              TextMatch& match);
-    static std::size_t fieldEnd(const Pattern& pattern, Field field, std::string_view bytes, std::size_t at);
+    static bool matchPattern(const Pattern& pattern, Reach& reach, TextMatch& match);
+    static bool matchUpToText(const Pattern& pattern, Reach& reach, Position& position, TextMatch& match);
+    static std::size_t fieldEnd(const Pattern& pattern, Field field, Reach& reach, std::size_t at);
 
     std::vector<std::vector<Pattern>> mPatternsByFirstByte;
 };

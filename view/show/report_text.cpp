@@ -107,6 +107,8 @@ std::string stateWords(TreeState state) {
         return "cut off";
     case TreeState::Ended:
         return "ended early";
+    case TreeState::NotConfigured:
+        return "not configured";
     default:
         return {};
     }

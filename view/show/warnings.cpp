@@ -15,6 +15,8 @@ std::string words(const DiffWarning& warning, const Difference& difference) {
     case DiffWarning::Kind::TwoHosts:
         return "the logs are of two hosts: " + printable(difference.hostBefore) + " and " +
                printable(difference.hostAfter);
+    case DiffWarning::Kind::NoCommonInitiator:
+        return "the logs have no initiator in common: they may be of two hosts";
     case DiffWarning::Kind::NotWhole:
         return log + " is not whole: what it does not reach counts as lost";
     case DiffWarning::Kind::TreeEnded:

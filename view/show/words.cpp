@@ -22,7 +22,8 @@ std::string_view name(Tree tree) {
 }
 
 std::string_view name(TreeState state) {
-    static constexpr std::array<std::string_view, 4> kNames = {"absent", "cut", "built", "ended"};
+    static constexpr std::array<std::string_view, 5> kNames = {"absent", "cut", "built", "ended",
+                                                               "not-configured"};
     return pick(kNames, state);
 }
 
@@ -42,7 +43,7 @@ std::string_view name(Severity severity) {
 }
 
 std::string_view name(ProblemKind kind) {
-    static constexpr std::array<std::string_view, 19> kNames = {
+    static constexpr std::array<std::string_view, 20> kNames = {
         "log-cut",
         "assertion-failed",
         "tree-ended",
@@ -62,6 +63,7 @@ std::string_view name(ProblemKind kind) {
         "device-unsupported",
         "entry-ignored",
         "identifier-not-unique",
+        "foreign-text",
     };
     return pick(kNames, kind);
 }
