@@ -1,5 +1,7 @@
 #include "view/read/inquiry_section.hpp"
 
+#include <algorithm>
+#include <array>
 #include <cerrno>
 #include <system_error>
 #include <utility>
@@ -15,6 +17,26 @@ namespace {
 constexpr std::size_t kMaximumCauses = 4;
 
 constexpr std::string_view kTimedOut = "time-out"; // said by the causes themselves
+
+// What a text says of the identification, with nothing more in it.
+struct Failure {
+    Text text;
+    std::string_view words;
+};
+
+constexpr auto kFailures = std::to_array<Failure>({
+    {Text::PageMalformed, "page 0x83 is malformed"},
+    {Text::PageStatus, "reading page 0x83 ended with a SCSI error"},
+    {Text::PageIoctl, "reading page 0x83 failed in the kernel"},
+    {Text::PageTimeOut, "reading page 0x83 timed out"},
+    {Text::StandardTimeOut, "the standard INQUIRY timed out"},
+    {Text::StandardUnsupported, "the device refused the standard INQUIRY"},
+    {Text::StandardIoctl, "the standard INQUIRY failed in the kernel"},
+    {Text::StandardStatus, "the standard INQUIRY ended with a SCSI error"},
+    {Text::StandardMalformed, "its standard INQUIRY data are malformed"},
+    {Text::StandardUnparsable, "its standard INQUIRY data could not be read"},
+    {Text::StandardExpired, "its entry in the file system is stale"},
+});
 
 // The name SAM gives a SCSI status code.
 std::string scsiStatusName(unsigned code) {
@@ -84,45 +106,22 @@ void InquirySection::take(const TextMatch& match) {
     case Text::StandardInquiryId:
         mAnswers.chosen = IdentifierKind::StandardInquiry;
         break;
-    case Text::PageMalformed:
-        fail("page 0x83 is malformed");
-        break;
-    case Text::PageStatus:
-        fail("reading page 0x83 ended with a SCSI error");
-        break;
-    case Text::PageIoctl:
-        fail("reading page 0x83 failed in the kernel");
-        break;
     case Text::PageUnsupported:
         fail("the device has no page 0x83", false);
         break;
-    case Text::PageTimeOut:
-        fail("reading page 0x83 timed out");
-        break;
-    case Text::StandardTimeOut:
-        fail("the standard INQUIRY timed out");
-        break;
-    case Text::StandardUnsupported:
-        fail("the device refused the standard INQUIRY");
-        break;
-    case Text::StandardIoctl:
-        fail("the standard INQUIRY failed in the kernel");
-        break;
-    case Text::StandardStatus:
-        fail("the standard INQUIRY ended with a SCSI error");
-        break;
-    case Text::StandardMalformed:
-        fail("its standard INQUIRY data are malformed");
-        break;
-    case Text::StandardUnparsable:
-        fail("its standard INQUIRY data could not be read");
-        break;
-    case Text::StandardExpired:
-        fail("its entry in the file system is stale");
-        break;
     default:
-        takeScsi(match);
+        takeFailure(match);
         break;
+    }
+}
+
+void InquirySection::takeFailure(const TextMatch& match) {
+    const auto failure = std::find_if(kFailures.begin(), kFailures.end(),
+                                      [&](const Failure& known) { return known.text == match.text; });
+    if (failure != kFailures.end()) {
+        fail(failure->words);
+    } else {
+        takeScsi(match);
     }
 }
 
@@ -170,9 +169,9 @@ void InquirySection::find(IdentifierKind kind, std::string_view designator) {
 
 void InquirySection::sayLineEnds(const std::string& device) {
     if (mAnswers.lineEnds) {
-        mDraft->problem(Severity::Problem, ProblemKind::ForeignText, device,
-                        "a designator of its page 0x83 holds a line end; what follows it in the log may look "
-                        "like Morvane's own lines, but is the device's and not taken for them");
+        mDraft.problem(Severity::Problem, ProblemKind::ForeignText, device,
+                       "a designator of its page 0x83 holds a line end; what follows it in the log may look "
+                       "like Morvane's own lines, but is the device's and not taken for them");
         mAnswers.lineEnds = false;
     }
 }

@@ -15,7 +15,7 @@ namespace view {
 // the identifier came from.
 class InquirySection {
 public:
-    explicit InquirySection(Draft& draft) : mDraft(&draft) {}
+    explicit InquirySection(Draft& draft) : mDraft(draft) {}
 
     // Takes a text of Section::Inquiry.
     void take(const TextMatch& match);
@@ -64,10 +64,11 @@ private:
     };
 
     void find(IdentifierKind kind, std::string_view designator);
+    void takeFailure(const TextMatch& match);
     void takeScsi(const TextMatch& match);
     void fail(std::string_view words, bool isFailure = true);
 
-    Draft* mDraft;
+    Draft& mDraft;
     std::string mDevice;
     Answers mAnswers;
 };
