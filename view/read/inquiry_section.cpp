@@ -116,8 +116,8 @@ void InquirySection::take(const TextMatch& match) {
 }
 
 void InquirySection::takeFailure(const TextMatch& match) {
-    const auto failure = std::find_if(kFailures.begin(), kFailures.end(),
-                                      [&](const Failure& known) { return known.text == match.text; });
+    const auto* const failure = std::find_if(kFailures.begin(), kFailures.end(),
+                                             [&](const Failure& known) { return known.text == match.text; });
     if (failure != kFailures.end()) {
         fail(failure->words);
     } else {

@@ -57,8 +57,8 @@ bool mayGoOn(std::string_view bytes) {
 
 // The one of all readers: it is the same for each of many logs.
 const TextMatcher& matcher() {
-    static const TextMatcher sMatcher(knownTexts());
-    return sMatcher;
+    static const TextMatcher kMatcher(knownTexts());
+    return kMatcher;
 }
 
 } // namespace

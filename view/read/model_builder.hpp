@@ -14,6 +14,20 @@
 
 namespace view {
 
+// One run of the program: its model, and a reader of each section.
+struct Run {
+    Draft draft;
+    InquirySection inquiry{draft};
+    MultipathSection multipath{draft};
+    FcSection fc{draft, inquiry};
+    IscsiSection iscsi{draft, inquiry};
+    DeviceSection devices{draft, inquiry};
+    std::uint64_t misplacedTexts = 0; // that their part does not write in the section they stand in
+    std::uint64_t firstMisplaced = 0; // the line of the first
+    bool ended = false;
+    bool asserted = false;
+};
+
 // Turns the texts of a log, in their order, into the model of the last run that begins in it. Report lines
 // give the paths and devices; the progress texts between them give the causes of what is missing.
 class ModelBuilder {
@@ -28,20 +42,6 @@ public:
     Model finish(LogFacts facts);
 
 private:
-    // One run of the program: its model, and a reader of each section.
-    struct Run {
-        Draft draft;
-        InquirySection inquiry{draft};
-        MultipathSection multipath{draft};
-        FcSection fc{draft, inquiry};
-        IscsiSection iscsi{draft, inquiry};
-        DeviceSection devices{draft, inquiry};
-        std::uint64_t misplacedTexts = 0; // that their part does not write in the section they stand in
-        std::uint64_t firstMisplaced = 0; // the line of the first
-        bool ended = false;
-        bool asserted = false;
-    };
-
     void beginRun();
     void misplace();
     void takeFrame(const TextMatch& match);
