@@ -1,28 +1,24 @@
 #include <unistd.h>
 
-#include <cerrno>
 #include <cstdlib>
 #include <exception>
-#include <filesystem>
-#include <fstream>
-#include <functional>
 #include <iostream>
-#include <stdexcept>
 #include <string>
-#include <system_error>
 #include <vector>
 
 #include <CLI/CLI.hpp>
 #include <nlohmann/json.hpp>
 
+#include "view/input_log.hpp"
 #include "view/model/diff.hpp"
 #include "view/model/san.hpp"
-#include "view/read/log_reader.hpp"
+#include "view/output_file.hpp"
 #include "view/show/escape.hpp"
 #include "view/show/html_page.hpp"
 #include "view/show/json.hpp"
 #include "view/show/text.hpp"
 #include "view/show/warnings.hpp"
+#include "view/trouble.hpp"
 
 namespace {
 
@@ -30,63 +26,9 @@ constexpr int kExitSame = 0;
 constexpr int kExitDifferent = 1;
 constexpr int kExitTrouble = 2;
 
-// What stops the program, in a sentence for its user.
-class Trouble : public std::runtime_error {
-public:
-    using std::runtime_error::runtime_error;
-};
-
-std::string systemError() {
-    return std::system_category().message(errno);
-}
-
-view::Model openLog(const std::string& path) {
-    view::Model model;
-    if (path == "-") {
-        model = view::readLog(std::cin, "standard input");
-    } else {
-        std::error_code ignored;
-        if (std::filesystem::is_directory(path, ignored)) {
-            throw Trouble(path + ": is a folder; the log is the file Morvane.log in it");
-        }
-        errno = 0;
-        std::ifstream file(path, std::ios::binary);
-        if (!file) {
-            throw Trouble(path + ": " + systemError());
-        }
-        model = view::readLog(file, path);
-        if (file.bad()) {
-            throw Trouble(path + ": " + systemError());
-        }
-    }
-    if (model.log.bytes == 0) {
-        throw Trouble(path + ": the log is empty");
-    }
-    if (model.log.knownTexts == 0 || model.log.unknownPieces > model.log.knownTexts) {
-        throw Trouble(path + ": is not a Morvane log");
-    }
-    return model;
-}
-
 void warnOf(const view::Model& model) {
     for (const std::string& warning : view::warningsOf(model.log)) {
-        std::cerr << "morvane-view: warning: " << model.log.name << ": " << warning << '\n';
-    }
-}
-
-void writeFile(const std::string& path, const std::function<void(std::ostream&)>& write) {
-    if (path == "-") {
-        write(std::cout);
-        return;
-    }
-    errno = 0;
-    std::ofstream file(path, std::ios::binary);
-    if (file) {
-        write(file);
-        file.flush();
-    }
-    if (!file) {
-        throw Trouble(path + ": " + systemError());
+        std::cerr << "morvane-view: warning: " << view::printable(model.log.name) << ": " << warning << '\n';
     }
 }
 
@@ -109,14 +51,15 @@ struct Options {
 };
 
 int report(const Options& options) {
-    const view::Model model = openLog(options.log);
+    const view::Model model = view::openLog(options.log);
     if (!options.page.empty()) {
         const std::string host = model.host.empty() ? "an unnamed host" : view::printable(model.host);
         nlohmann::ordered_json reports = nlohmann::ordered_json::array();
         reports.push_back(named(host, model));
         const nlohmann::ordered_json document = {
             {"title", "Storage paths of " + host}, {"reports", std::move(reports)}, {"san", nullptr}};
-        writeFile(options.page, [&](std::ostream& output) { view::writePage(output, document); });
+        view::writeOutput(options.page, {options.log},
+                          [&](std::ostream& output) { view::writePage(output, document); });
     }
     if (options.json) {
         std::cout << view::toJson(model).dump(2) << '\n';
@@ -130,7 +73,8 @@ int report(const Options& options) {
 }
 
 int diff(const Options& options) {
-    const view::Difference difference = view::compare(openLog(options.before), openLog(options.after));
+    const view::Difference difference =
+        view::compare(view::openLog(options.before), view::openLog(options.after));
     if (options.json) {
         std::cout << view::toJson(difference).dump(2) << '\n';
     } else {
@@ -141,9 +85,18 @@ int diff(const Options& options) {
 
 int san(const Options& options) {
     std::vector<view::Model> reports;
+    int status = kExitSame;
     for (const std::string& log : options.logs) {
-        reports.push_back(openLog(log));
-        warnOf(reports.back());
+        try {
+            reports.push_back(view::openLog(log));
+            warnOf(reports.back());
+        } catch (const view::Trouble& trouble) {
+            std::cerr << "morvane-view: left out: " << trouble.what() << '\n';
+            status = kExitTrouble;
+        }
+    }
+    if (reports.empty()) {
+        throw view::Trouble("there is no log to show");
     }
     const view::San joined = view::join(reports);
     if (!options.page.empty()) {
@@ -156,14 +109,15 @@ int san(const Options& options) {
             {"title", "SAN view of " + std::to_string(reports.size()) + " logs"},
             {"reports", std::move(list)},
             {"san", summary}};
-        writeFile(options.page, [&](std::ostream& output) { view::writePage(output, document); });
+        view::writeOutput(options.page, options.logs,
+                          [&](std::ostream& output) { view::writePage(output, document); });
     }
     if (options.json) {
         std::cout << view::toJson(joined).dump(2) << '\n';
     } else if (options.page.empty()) {
         view::writeText(std::cout, joined, outputStyle());
     }
-    return kExitSame;
+    return status;
 }
 
 constexpr const char* kExamples = R"(Examples:
@@ -215,7 +169,7 @@ int run(int argc, char** argv) {
     }
     std::cout.flush();
     if (!std::cout) {
-        throw Trouble("standard output: the report could not be written");
+        throw view::Trouble("standard output: the report could not be written");
     }
     return status;
 }

@@ -1,6 +1,8 @@
 #!/usr/bin/python3
 """Runs morvane-view on logs and checks what it says. usage: program_test.py MORVANE-VIEW SIMHOST MORVANE"""
 
+import base64
+import hashlib
 import json
 import os
 import pty
@@ -210,6 +212,93 @@ class Colour(unittest.TestCase):
         self.assertIn(b"\x1b[", self.shown_on_terminal(NO_COLOR=""))
         self.assertNotIn(b"\x1b", self.shown_on_terminal(NO_COLOR="1"))
         self.assertNotIn(b"\x1b", run("-", log=host_log("das-naa")).stdout)
+
+
+class Evidence(unittest.TestCase):
+    """What is read is never written over, and one bad log costs no other."""
+
+    def setUp(self):
+        temporary = tempfile.TemporaryDirectory()
+        self.addCleanup(temporary.cleanup)
+        self.folder = Path(temporary.name)
+        self.log = make_log.healthy().bytes()
+        (self.folder / "MorvaneLogs").mkdir()
+        self.place = self.folder / "MorvaneLogs" / "Morvane.log"
+        self.place.write_bytes(self.log)
+
+    def refused(self, message, *arguments):
+        before = sorted(path.name for path in self.folder.rglob("*"))
+        done = run(*arguments, folder=self.folder)
+        self.assertEqual((done.returncode, done.stdout, done.stderr.decode()), (2, b"", f"morvane-view: {message}\n"))
+        self.assertEqual(self.place.read_bytes(), self.log)
+        self.assertEqual(sorted(path.name for path in self.folder.rglob("*")), before)
+
+    def test_a_page_does_not_replace_the_log_whose_page_it_is(self):
+        self.refused("MorvaneLogs/Morvane.log: is a log that is to be read; name another file to write to",
+                     "--html", "MorvaneLogs/Morvane.log")
+        (self.folder / "link").symlink_to(self.place)
+        self.refused("link: is a log that is to be read; name another file to write to", "--html", "link")
+
+    def test_a_page_does_not_replace_another_log(self):
+        other = self.folder / "other.log"
+        other.write_bytes(self.log)
+        self.refused("other.log: is a Morvane log; name another file to write to", "san", "--html", "other.log",
+                     "MorvaneLogs/Morvane.log")
+        self.assertEqual(other.read_bytes(), self.log)
+
+    def test_a_page_replaces_an_older_one_whole_or_not_at_all(self):
+        page = self.folder / "page.html"
+        page.write_text("an older page")
+        page.chmod(0o640)
+        self.assertEqual(run("--html", page, folder=self.folder).returncode, 0)
+        self.assertTrue(page.read_text().endswith("</html>\n"))
+        self.assertEqual(page.stat().st_mode & 0o777, 0o640)
+        self.assertEqual([path.name for path in self.folder.iterdir() if path.name.startswith("page")], ["page.html"])
+
+    def test_a_page_that_cannot_be_written_leaves_what_was_there(self):
+        self.refused("nowhere/page.html: No such file or directory", "--html", "nowhere/page.html")
+        full = run("--html", "/dev/full", folder=self.folder)
+        self.assertEqual((full.returncode, full.stderr), (2, b"morvane-view: /dev/full: No space left on device\n"))
+
+    def test_many_logs_are_shown_without_the_bad_ones(self):
+        (self.folder / "empty.log").write_bytes(b"")
+        (self.folder / "text.log").write_bytes(b"nothing that Morvane writes\n" * 3)
+        good = run("san", "MorvaneLogs/Morvane.log", folder=self.folder)
+        done = run("san", "empty.log", "MorvaneLogs/Morvane.log", "missing.log", "text.log", folder=self.folder)
+        self.assertEqual((done.returncode, done.stdout), (2, good.stdout))
+        self.assertEqual(done.stderr.decode(), "morvane-view: left out: empty.log: the log is empty\n"
+                                               "morvane-view: left out: missing.log: No such file or directory\n"
+                                               "morvane-view: left out: text.log: is not a Morvane log\n")
+        none = run("san", "empty.log", folder=self.folder)
+        self.assertEqual((none.returncode, none.stdout, none.stderr.decode()),
+                         (2, b"", "morvane-view: left out: empty.log: the log is empty\n"
+                                  "morvane-view: there is no log to show\n"))
+
+    def test_names_of_files_are_escaped_in_messages(self):
+        done = run("a\x1b[31mb\nc", folder=self.folder)
+        self.assertEqual((done.returncode, done.stderr.decode()),
+                         (2, "morvane-view: a\\x1B[31mb\\x0Ac: No such file or directory\n"))
+
+    def test_input_without_an_end_is_given_up(self):
+        done = run("/dev/zero")
+        self.assertEqual((done.returncode, done.stderr), (2, b"morvane-view: /dev/zero: is not a Morvane log\n"))
+        with open("/dev/urandom", "rb") as endless:
+            done = subprocess.run([PROGRAM, "-"], stdin=endless, capture_output=True, check=False, timeout=60)
+        self.assertEqual((done.returncode, done.stderr), (2, b"morvane-view: -: is not a Morvane log\n"))
+
+    def test_a_log_is_read_across_a_hole_of_nuls(self):
+        half = len(self.log) // 2
+        (self.folder / "hole.log").write_bytes(self.log[:half] + bytes(3 << 20) + self.log[half:])
+        self.assertEqual(run("hole.log", folder=self.folder).returncode, 0)
+
+    def test_a_page_runs_its_own_script_alone(self):
+        page = run("--html", "-", "MorvaneLogs/Morvane.log", folder=self.folder).stdout.decode()
+        policy = re.search('http-equiv="Content-Security-Policy"\\s+content="([^"]*)"', page)[1]
+        for element in ("script", "style"):
+            text = re.search(f"<{element}>(.*?)</{element}>", page, re.S)[1].encode()
+            digest = base64.b64encode(hashlib.sha256(text).digest()).decode()
+            self.assertIn(f"{element}-src 'sha256-{digest}'", policy)
+        self.assertTrue(policy.startswith("default-src 'none'; "))
 
 
 class Errors(unittest.TestCase):

@@ -85,6 +85,14 @@ void LogReader::feed(std::string_view bytes) {
     }
 }
 
+bool LogReader::isHopeless() const {
+    constexpr std::uint64_t kMostBeforeAKnownText = 1U << 20U;
+    constexpr std::uint64_t kMostForeign = 1U << 26U; // more than any hole that a damaged log was seen with
+    const std::uint64_t foreign = mFacts.bytes - mFacts.knownBytes;
+    return mFacts.knownTexts == 0 ? foreign > kMostBeforeAKnownText
+                                  : foreign > kMostForeign + 16 * mFacts.knownBytes;
+}
+
 Model LogReader::finish() {
     if (!mPartialLine.empty()) {
         takeLine(std::exchange(mPartialLine, {}));
@@ -192,6 +200,9 @@ Model readLog(std::istream& input, const std::string& name) {
     while (input) {
         input.read(buffer.data(), static_cast<std::streamsize>(buffer.size()));
         reader.feed({buffer.data(), static_cast<std::size_t>(input.gcount())});
+        if (reader.isHopeless()) {
+            throw NotALog();
+        }
     }
     return reader.finish();
 }

@@ -22,6 +22,10 @@ public:
     // Takes the next bytes of the log.
     void feed(std::string_view bytes);
 
+    // Whether what was fed so far cannot be the beginning of a log: it is long, and (nearly) nothing of it is
+    // known.
+    [[nodiscard]] bool isHopeless() const;
+
     // Ends the log and returns what it says. The reader is used up.
     Model finish();
 
@@ -43,7 +47,10 @@ private:
     bool mInForeign = false;  // the lines held end inside a foreign text
 };
 
-// Reads a whole stream.
+// Thrown for input that is none of Morvane's logs.
+struct NotALog {};
+
+// Reads a whole stream. Throws NotALog as soon as it is hopeless, so that input without an end has one.
 Model readLog(std::istream& input, const std::string& name);
 
 } // namespace view
