@@ -72,7 +72,7 @@ TEST(Assertion, EndsTheProcessEvenWhenTheLogRefusesItsLine) {
             const RefusingLog log;
             assertionFailed("false");
         },
-        testing::ExitedWithCode(1), testing::StrEq(""));
+        testing::ExitedWithCode(1), testing::StrEq("Assertion [ false ] failed\n"));
 }
 
 } // namespace
