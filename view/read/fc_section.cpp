@@ -8,11 +8,11 @@ void FcSection::take(const TextMatch& match) {
     const std::string_view first = match.fields[0];
     switch (match.text) {
     case Text::HbaLoadTime:
-        mDraft.model.fc.loadMilliseconds = toNumber<double>(first);
+        mDraft.model.fc.loadMilliseconds = toMilliseconds(first);
         break;
     case Text::FcBuildTime:
         close();
-        mDraft.model.fc.buildMilliseconds = toNumber<double>(first);
+        mDraft.model.fc.buildMilliseconds = toMilliseconds(first);
         break;
     case Text::HbaLoadFailed:
         mCause = "the HBA library could not be loaded: " + text(first);

@@ -1,5 +1,10 @@
 #include "view/read/fields.hpp"
 
+#include <cmath>
+#include <cstdlib>
+#include <limits>
+#include <string>
+
 namespace view {
 
 unsigned hexToNumber(std::string_view digits) {
@@ -25,6 +30,11 @@ std::string join(const std::vector<std::string>& parts, std::string_view between
         joined += joined.empty() ? part : std::string(between) + part;
     }
     return joined;
+}
+
+double toMilliseconds(std::string_view digits) {
+    const double number = std::strtod(std::string(digits).c_str(), nullptr);
+    return std::isfinite(number) ? number : std::numeric_limits<double>::max();
 }
 
 } // namespace view

@@ -17,6 +17,10 @@ Number toNumber(std::string_view digits) {
     return error == std::errc::result_out_of_range ? std::numeric_limits<Number>::max() : number;
 }
 
+// The number of a text such as "1.50", the largest one for what is too large. Not with from_chars, which
+// older C++ libraries have for whole numbers only; the program sets no locale.
+double toMilliseconds(std::string_view digits);
+
 // The number that a field's hexadecimal digits stand for; 0 when it is too great.
 unsigned hexToNumber(std::string_view digits);
 
