@@ -12,9 +12,20 @@ endif()
 
 if(MORVANE_HARDENED)
   target_compile_options(morvane_options INTERFACE
-    -fstack-protector-strong -fstack-clash-protection -fcf-protection -U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2
-    -ffile-prefix-map=${CMAKE_SOURCE_DIR}=.)
+    -fstack-protector-strong -U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2 -ffile-prefix-map=${CMAKE_SOURCE_DIR}=.)
+  if(CMAKE_SYSTEM_PROCESSOR MATCHES "86")
+    target_compile_options(morvane_options INTERFACE -fcf-protection)
+  endif()
+  if(NOT CMAKE_SYSTEM_PROCESSOR STREQUAL "aarch64" OR CMAKE_CXX_COMPILER_ID STREQUAL "GNU") # Clang 14 has none there
+    target_compile_options(morvane_options INTERFACE -fstack-clash-protection)
+  endif()
   target_link_options(morvane_options INTERFACE -Wl,-z,relro,-z,now,-z,noexecstack,-z,text)
+endif()
+
+# Whatever of the C++ runtime nothing calls stays out of the programs: with it would come its need of a young glibc.
+if(MORVANE_PORTABLE)
+  target_compile_options(morvane_options INTERFACE -ffunction-sections -fdata-sections)
+  target_link_options(morvane_options INTERFACE -Wl,--gc-sections,--as-needed)
 endif()
 
 if(MORVANE_SANITIZED)

@@ -1,5 +1,5 @@
-# What `cmake --install` puts where, and the Debian packages of it: one for each program, a component of its name.
-# ./dev package makes the packages: it knows what they depend on.
+# What `cmake --install` puts where, and the packages of it: one for each program, a component of its name. A portable
+# build makes RPMs, any other Debian packages; ./dev package makes those: it knows what they depend on.
 include(GNUInstallDirs)
 set(CMAKE_SKIP_INSTALL_ALL_DEPENDENCY ON) # installing needs the programs, not the tests
 
@@ -16,8 +16,8 @@ function(morvane_gzip SOURCE)
 endfunction()
 morvane_gzip(packaging/changelog)
 
-# Installs a program with what every package holds: its manual page, the copyright, the changelog and what lintian is
-# to overlook.
+# Installs a program with what every package holds: its manual page and the copyright; for Debian the changelog, too, and
+# what lintian is to overlook.
 function(morvane_install PROGRAM FOLDER MANUAL)
   install(TARGETS ${PROGRAM} RUNTIME DESTINATION ${FOLDER} COMPONENT ${PROGRAM})
   # Stripping also takes the compilers' names, as Debian's packages do it.
@@ -30,13 +30,22 @@ function(morvane_install PROGRAM FOLDER MANUAL)
   string(REGEX MATCH "[1-8]$" section ${page})
   install(FILES ${CMAKE_BINARY_DIR}/${page}.gz
     DESTINATION ${CMAKE_INSTALL_MANDIR}/man${section} COMPONENT ${PROGRAM})
+  if(MORVANE_PORTABLE)
+    install(FILES packaging/copyright DESTINATION ${CMAKE_INSTALL_DATADIR}/licenses/${PROGRAM} COMPONENT ${PROGRAM})
+    return()
+  endif()
   install(FILES packaging/copyright ${CMAKE_BINARY_DIR}/changelog.gz
     DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/${PROGRAM} COMPONENT ${PROGRAM})
   install(FILES packaging/${PROGRAM}.lintian-overrides
     DESTINATION ${CMAKE_INSTALL_DATADIR}/lintian/overrides RENAME ${PROGRAM} COMPONENT ${PROGRAM})
 endfunction()
 
-set(CPACK_GENERATOR DEB)
+if(MORVANE_PORTABLE)
+  set(CPACK_GENERATOR RPM)
+else()
+  set(CPACK_GENERATOR DEB)
+endif()
+set(CPACK_PACKAGE_VENDOR "Morvane maintainers")
 set(CPACK_PACKAGE_CONTACT "Morvane maintainers <morvane@example.org>")
 set(CPACK_PACKAGE_DESCRIPTION_SUMMARY "") # each package's description begins with its own
 set(CPACK_STRIP_FILES ON)
@@ -94,4 +103,5 @@ one view of the SAN.
 .
 It needs no storage, no root and no Morvane on the machine that reads.")
 endif()
+include(cmake/Rpm.cmake)
 include(CPack)
