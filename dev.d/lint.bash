@@ -16,6 +16,7 @@ cmd_lint() {
     sources | grep '\.cpp$' | xargs -P "$(nproc)" -n 4 clang-tidy --quiet -p build/debug 2>/dev/null
     shellcheck -x -a dev # with all it sources
     shellcheck .ci/run tests/hardening/check.sh tests/packages/install_and_run view/morvane-view.bash
+    shellcheck tests/dist/{build_again,check_program,install_rpms,run_in_clean_root}
     (cd lab/guest && shellcheck -x ../build-guest init course ./*.sh)
     lint_manual
     echo "lint: clean"
