@@ -6,7 +6,8 @@ set(CMAKE_SYSTEM_PROCESSOR ${MORVANE_PROCESSOR})
 cmake_path(GET CMAKE_CURRENT_LIST_DIR PARENT_PATH root)
 set(CMAKE_SYSROOT ${root}/build/sysroot/${MORVANE_PROCESSOR})
 set(CMAKE_CXX_COMPILER clang++-14)
-set(CMAKE_CXX_COMPILER_TARGET ${MORVANE_PROCESSOR}-linux-gnu)
+string(REGEX REPLACE "^ppc" "powerpc" name ${MORVANE_PROCESSOR}) # as the cross linkers are called
+set(CMAKE_CXX_COMPILER_TARGET ${name}-linux-gnu)
 set(CMAKE_STRIP /usr/bin/llvm-strip-14) # for every processor the same
 set(CMAKE_EXE_LINKER_FLAGS_INIT "-static-libstdc++ -static-libgcc") # the sysroot has no shared C++ runtime
 foreach(kind LIBRARY INCLUDE PACKAGE)

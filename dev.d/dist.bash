@@ -1,8 +1,11 @@
 # shellcheck shell=bash
-# ./dev dist and ./dev test-dist: the programs for every server, as tarballs and RPMs, in build/dist.
+# ./dev dist, ./dev test-dist and ./dev test-processors: the programs for every server, as tarballs and RPMs, in
+# build/dist.
 
 dist_packages=(cmake ninja-build clang llvm xz-utils rpm rpmlint)
 test_dist_packages=(mmdebstrap arch-test diffoscope-minimal)
+other_processors=(aarch64 ppc64le s390x)
+other_processor_packages=(binutils-aarch64-linux-gnu binutils-powerpc64le-linux-gnu binutils-s390x-linux-gnu)
 
 # The mirror of Debian's archive that this host installs from.
 debian_mirror() {
@@ -32,6 +35,13 @@ sysroot() {
     echo "$wanted" >"$root.packages"
 }
 
+# configure_dist PROCESSOR OPTION...: the build for a processor, its sysroot laid out.
+configure_dist() {
+    case " ${other_processors[*]} " in *" $1 "*) need "${other_processor_packages[@]}" ;; esac
+    sysroot "$1"
+    cmake --preset "dist-$1" "${@:2}" >/dev/null
+}
+
 # tarball PROCESSOR VERSION: what `cmake --install` lays out, checked, and a README, as an archive of the same bytes each
 # time.
 tarball() {
@@ -50,13 +60,16 @@ cmd_dist() {
     need "${dist_packages[@]}"
     SOURCE_DATE_EPOCH=$(git log -1 --format=%ct) # the same sources make the same bytes
     export SOURCE_DATE_EPOCH
+    umask 022 # as the folders in an RPM are to be
     rm -rf build/dist
     mkdir -p build/dist
     local processor version
-    [ $# -gt 0 ] || set -- x86_64 i686
+    case ${1-} in
+        "") set -- x86_64 i686 ;;
+        all) set -- x86_64 i686 "${other_processors[@]}" ;;
+    esac
     for processor in "$@"; do
-        sysroot "$processor"
-        cmake --preset "dist-$processor" >/dev/null
+        configure_dist "$processor"
         cmake --build --preset "dist-$processor" -- --quiet morvane morvane-view compressed_documents
         version=$(sed -n 's/^CMAKE_PROJECT_VERSION:STATIC=//p' "build/dist-$processor/CMakeCache.txt")
         tarball "$processor" "$version"
@@ -82,4 +95,22 @@ cmd_test_dist() {
         done
     done
     tests/dist/build_again x86_64 build/dist
+}
+
+# The unit tests and morvane-view's reports, on processors that this machine has not: under qemu-user.
+cmd_test_processors() {
+    need "${dist_packages[@]}" "${test_packages[@]}" qemu-user
+    [ $# -gt 0 ] || set -- "${other_processors[@]}"
+    local processor failed=()
+    for processor in "$@"; do
+        echo "== $processor"
+        configure_dist "$processor" -DMORVANE_TESTS=ON
+        cmake --build --preset "dist-$processor" -- --quiet all
+        ctest --preset "dist-$processor" || failed+=("$processor: unit tests")
+        printf '#!/bin/sh\nexec qemu-%s -L "%s" "%s" "$@"\n' "$processor" "$PWD/build/sysroot/$processor" \
+            "$PWD/build/dist-$processor/view/morvane-view" >"$scratch/morvane-view"
+        chmod +x "$scratch/morvane-view"
+        /usr/bin/python3 tests/view/golden_test.py "$scratch/morvane-view" || failed+=("$processor: morvane-view")
+    done
+    [ ${#failed[@]} -eq 0 ] || { printf 'failed: %s\n' "${failed[@]}" >&2; return 1; }
 }

@@ -13,7 +13,7 @@ fail() {
 header=$(readelf -Wh "$program")
 segments=$(readelf -Wl "$program")
 dynamic=$(readelf -Wd "$program")
-imports=$(readelf -W --dyn-syms "$program" | awk '$7 == "UND" { print $8 }')
+imports=$(readelf -W --dyn-syms "$program" | sed 's| \[<localentry>: [0-9]*\]||' | awk '$7 == "UND" { print $8 }')
 
 case $property in
     position_independent)
