@@ -303,7 +303,7 @@ void sBuildAndOutput() {
 void sFirstBuildAndOutput() {
     const FunctionTrace trace("sFirstBuildAndOutput");
     const timeval start = wallClock();
-    showProgress("FC", "loading the HBA library");
+    showProgress("FC", "HBA library");
     HA_LoadHbaapi();
     const timeval end = wallClock();
     logPrintf("Time taken to load HBAAPI: %.2f milliseconds\n", elapsedMilliseconds(start, end));

@@ -7,7 +7,8 @@
 
 // A shell command that is running, and the pipe that its standard output goes to. The command has nothing of
 // the run but its standard error: /dev/null is its standard input, no descriptor of Morvane's is open in it,
-// and its environment is a fixed path to the system's programs and the C locale, whatever the caller's holds.
+// a pipe that nobody reads ends it, and its environment is a fixed path to the system's programs and the C
+// locale, whatever the caller's holds.
 class CommandOutput {
 public:
     // Starts the command, once everything logged so far is with the kernel. Throws WriteFailedEx when the log
@@ -15,7 +16,8 @@ public:
     explicit CommandOutput(const char* command);
     CommandOutput(const CommandOutput&) = delete;
     CommandOutput& operator=(const CommandOutput&) = delete;
-    ~CommandOutput() { finish(); }
+    // Waits for the command as close does, unless the log takes no more: then the run is to end.
+    ~CommandOutput();
 
     bool isOpen() const { return mStream != nullptr; }
 

@@ -11,7 +11,7 @@
 #include "foundation/integers.hpp"
 
 // Destination of every trace and report line; null until the run has opened its log file, and standard error
-// stands in for it then. Set once by the entry, never closed: exit flushes it. Not owned by anybody else.
+// stands in for it then. Set once by the entry, never closed. Not owned by anybody else.
 extern std::FILE* gLogStream;
 
 // Writes a line of the trace: formats like printf. Returns the number of characters written. Throws

@@ -6,10 +6,12 @@
 #include <sys/sysmacros.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <climits>
 #include <cstdlib>
 #include <exception>
+#include <list>
 #include <string>
 
 #include "foundation/clib_error.hpp"
@@ -70,27 +72,58 @@ void makeDirectory() {
     }
 }
 
-// Where the link at `path` leads, if it is one that the user or root made; `path` where it is none.
-std::string trustedPath(const char* path) {
-    // The entry itself: what is looked at is what is followed, even if another stands there a moment later.
-    const int entry = open(path, O_PATH | O_NOFOLLOW | O_CLOEXEC);
-    struct stat status {};
-    if (entry < 0 || fstat(entry, &status) != 0) {
-        refuse(path, errno);
+// The steps of a path from one directory to the next; the first of an absolute one is "/".
+std::list<std::string> stepsOf(const std::string& path) {
+    std::list<std::string> steps;
+    if (!path.empty() && path.front() == '/') {
+        steps.emplace_back("/");
     }
-    std::string target = path;
-    if (S_ISLNK(status.st_mode)) {
-        if (status.st_uid != geteuid() && status.st_uid != 0) {
-            throw Refusal{target + ": a link that " + userName(status.st_uid) + " made"};
+    for (std::size_t at = 0; at < path.size();) {
+        const std::size_t end = std::min(path.find('/', at), path.size());
+        if (end > at) {
+            steps.push_back(path.substr(at, end - at));
         }
-        char text[PATH_MAX] = {};
-        if (readlinkat(entry, "", text, sizeof text - 1) < 0) {
+        at = end + 1;
+    }
+    return steps;
+}
+
+// Opens the directory at `path`. Links on the way, the directory's own name among them, are followed if the
+// user or root made them. Every step is taken from a directory that is held open: nobody can exchange what
+// was looked at.
+int openTrusted(const char* path) {
+    constexpr int kMostLinks = 40;
+    std::list<std::string> steps = stepsOf(path);
+    int place = open(".", O_PATH | O_DIRECTORY | O_CLOEXEC);
+    for (int links = 0; place >= 0 && !steps.empty();) {
+        const std::string step = steps.front();
+        steps.pop_front();
+        const int next = openat(place, step.c_str(), O_PATH | O_NOFOLLOW | O_CLOEXEC);
+        struct stat status {};
+        if (next < 0 || fstat(next, &status) != 0) {
             refuse(path, errno);
         }
-        target = text;
+        if (!S_ISLNK(status.st_mode)) {
+            close(place);
+            place = next;
+            continue;
+        }
+        if (status.st_uid != geteuid() && status.st_uid != 0) {
+            throw Refusal{std::string(path) + ": a link that " + userName(status.st_uid) + " made"};
+        }
+        char target[PATH_MAX] = {};
+        if (readlinkat(next, "", target, sizeof target - 1) < 0 || ++links > kMostLinks) {
+            refuse(path, links > kMostLinks ? ELOOP : errno);
+        }
+        close(next);
+        steps.splice(steps.begin(), stepsOf(target));
     }
-    static_cast<void>(close(entry));
-    return target;
+    const int directory = place < 0 ? -1 : openat(place, ".", O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (directory < 0) {
+        refuse(path, errno);
+    }
+    close(place);
+    return directory;
 }
 
 // The process that holds the lock of `file`, as the kernel lists it; 0 when that cannot be told.
@@ -124,13 +157,16 @@ void lock(int directory, const struct stat& status) {
         refuse(kDirectory, errno);
     }
     const long holder = lockHolder(status);
-    throw Refusal{std::string(kDirectory) + ": another run is writing its log there" +
-                  (holder > 0 ? " (process " + std::to_string(holder) + ")" : "")};
+    throw Refusal{std::string(kDirectory) + ": locked" +
+                  (holder > 0 ? " by process " + std::to_string(holder) : "") +
+                  ", as by a run that is writing its log there"};
 }
 
-// Whether the log may be written over: a regular file of the user's with no other name.
+// Whether the log may be written over: a regular file of the user's with no other name. One that others may
+// write to is not: somebody may have it open.
 bool isOwn(const struct stat& status) {
-    return S_ISREG(status.st_mode) && status.st_uid == geteuid() && status.st_nlink == 1;
+    return S_ISREG(status.st_mode) && status.st_uid == geteuid() && status.st_nlink == 1 &&
+           (status.st_mode & kOthersMayWrite) == 0;
 }
 
 bool isSame(const struct stat& a, const struct stat& b) {
@@ -164,7 +200,7 @@ int reopenOwn(const struct stat& directory) {
     if (!isOwn(opened) || !isSame(found, opened)) {
         throw Refusal{path + ": replaced while it was opened"};
     }
-    if (fchmod(file, opened.st_mode & ~(S_IFMT | kOthersMayWrite)) != 0 || ftruncate(file, 0) != 0) {
+    if (ftruncate(file, 0) != 0) {
         refuse(path, errno);
     }
     return file;
@@ -202,9 +238,9 @@ std::FILE* openLogFile() {
     try {
         haveStandardDescriptors();
         makeDirectory();
-        gDirectory = open(trustedPath(kDirectory).c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+        gDirectory = openTrusted(kDirectory);
         struct stat directory {};
-        if (gDirectory < 0 || fstat(gDirectory, &directory) != 0) {
+        if (fstat(gDirectory, &directory) != 0) {
             refuse(kDirectory, errno);
         }
         lock(gDirectory, directory);
@@ -218,6 +254,9 @@ std::FILE* openLogFile() {
 
 void completeLogFile(std::FILE* log) {
     flushLog();
+    if (logError() != 0) {
+        failLog(logError());
+    }
     for (const int fd : {fileno(log), gDirectory}) {
         // A file system may have nothing to bring to a disk, or no way to do so for a directory.
         if (fsync(fd) != 0 && errno != EINVAL && errno != ENOSYS && errno != EOPNOTSUPP) {
@@ -226,10 +265,13 @@ void completeLogFile(std::FILE* log) {
     }
     struct stat written {};
     struct stat named {};
-    if (fstat(fileno(log), &written) != 0 || fstatat(gDirectory, kName, &named, AT_SYMLINK_NOFOLLOW) != 0) {
+    if (fstat(fileno(log), &written) != 0 || lstat(kLogFile, &named) != 0) {
         failLog(errno);
     }
-    if (!isSame(written, named)) {
-        throw WriteFailedEx((std::string(kLogFile) + ": replaced during the run").c_str());
+    // A file that was cut has its size again, and NULs at its beginning, as soon as the next text is written.
+    char first = '\0';
+    if (!isSame(written, named) || written.st_size != ftello(log) || pread(fileno(log), &first, 1, 0) != 1 ||
+        first != '\n') {
+        throw WriteFailedEx((std::string(kLogFile) + ": changed during the run by somebody else").c_str());
     }
 }

@@ -2,6 +2,7 @@
 #include <stdio_ext.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -101,6 +102,8 @@ void tellFailure(const char* message) noexcept {
 
 int main() {
     static_cast<void>(std::atexit(clearProgress)); // for a failed assertion, too
+    static_cast<void>(
+        std::signal(SIGXFSZ, SIG_IGN)); // a limit of the log's size is a text that it cannot take
     try {
         run();
         return EXIT_SUCCESS;

@@ -8,9 +8,9 @@
 #include <unistd.h>
 
 #include <cerrno>
+#include <csignal>
 #include <cstdio>
 #include <cstring>
-#include <string>
 
 #include "fc/hba_api.hpp"
 
@@ -51,19 +51,20 @@ bool findAll(void* library) {
            find(library, "HBA_GetFcpTargetMapping", gHba.getFcpTargetMapping);
 }
 
-// One line on standard error: what is missing, or wrong with the library.
-void complain(const std::string& what) {
-    static_cast<void>(std::fprintf(stderr, "morvane: no Fibre Channel report: %s\n", what.c_str()));
+// One line on standard error: what is missing, or wrong with the library. Needs no memory.
+void complain(const char* what, const char* reason = "") noexcept {
+    static_cast<void>(std::fprintf(stderr, "morvane: no Fibre Channel report: %s%s\n", what, reason));
 }
 
 // Loads the library for good, its symbols there for the vendors' libraries as if it were linked. False, with
 // a complaint, when it cannot be loaded or lacks a function.
-bool load() {
+bool load() noexcept {
     void* const library = dlopen(kLibrary, RTLD_NOW | RTLD_GLOBAL);
     if (library != nullptr && findAll(library)) {
         return true;
     }
-    complain(dlerror());
+    const char* const reason = dlerror(); // none for a function that is there and leads nowhere
+    complain(reason != nullptr ? reason : "libHBAAPI.so.2 lacks a function");
     if (library != nullptr) {
         dlclose(library);
     }
@@ -74,18 +75,28 @@ bool load() {
 // promise, and whoever touches one is ended by a signal: not the run. False, with a complaint, when it does
 // not load.
 bool loadsElsewhere() {
+    // Whoever started the program may have had its children's ends ignored; then there would be none to wait
+    // for.
+    struct sigaction before {};
+    struct sigaction usual {};
+    usual.sa_handler = SIG_DFL;
+    sigaction(SIGCHLD, &usual, &before);
     const pid_t child = fork();
     if (child == 0) {
-        prctl(PR_SET_DUMPABLE, 0); // leaves no core file
-        _exit(load() ? 0 : 1);     // without a second flush of the log
+        prctl(PR_SET_PDEATHSIG, SIGKILL); // holds nothing of the run's beyond its end
+        prctl(PR_SET_DUMPABLE, 0);        // leaves no core file
+        _exit(load() ? 0 : 1);            // without a second flush of the log
     }
     int status = 0;
-    if (child < 0 || TEMP_FAILURE_RETRY(waitpid(child, &status, 0)) < 0) {
-        complain(std::strerror(errno));
+    const bool isOver = child > 0 && TEMP_FAILURE_RETRY(waitpid(child, &status, 0)) == child;
+    const int error = errno;
+    sigaction(SIGCHLD, &before, nullptr);
+    if (!isOver) {
+        complain(std::strerror(error));
         return false;
     }
     if (WIFSIGNALED(status)) {
-        complain(std::string(kLibrary) + " is damaged: " + strsignal(WTERMSIG(status)));
+        complain("libHBAAPI.so.2 is damaged: ", strsignal(WTERMSIG(status)));
         return false;
     }
     return status == 0;

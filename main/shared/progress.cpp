@@ -1,5 +1,6 @@
 #include "main/shared/progress.hpp"
 
+#include <poll.h>
 #include <sys/ioctl.h>
 #include <unistd.h>
 
@@ -26,8 +27,15 @@ std::size_t columns() {
     return isKnown ? size.ws_col : kUsualColumns;
 }
 
+// Writes to a terminal that takes it now: one that was stopped, or that another job has, would hold up the
+// run.
 void write(const char* text, std::size_t length) {
-    static_cast<void>(::write(STDERR_FILENO, text, length) < 0); // nobody is told that nobody can be told
+    const pid_t foreground = tcgetpgrp(STDERR_FILENO); // -1 on a terminal that is not the run's own
+    pollfd terminal = {.fd = STDERR_FILENO, .events = POLLOUT, .revents = 0};
+    if ((foreground < 0 || foreground == getpgrp()) && poll(&terminal, 1, 0) == 1 &&
+        (terminal.revents & POLLOUT) != 0) {
+        static_cast<void>(::write(STDERR_FILENO, text, length) < 0); // nobody is told that nobody can be told
+    }
 }
 
 } // namespace

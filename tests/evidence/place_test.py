@@ -91,13 +91,31 @@ class TheDirectory(Run):
                 self.assert_refused(self.morvane(user=user), NO_LOG, f"./MorvaneLogs: a link that user {owner} made")
                 self.assertEqual((self.target / "Morvane.log").read_text(), PRECIOUS)
 
-    def test_is_no_link_to_a_link(self):
+    def test_is_no_link_that_leads_through_one_of_somebody_elses(self):
+        # Root's link in nobody's directory, and nobody has exchanged a directory on its way.
+        self.link_logs(ROOT, ROOT)
+        os.chown(self.work, NOBODY, NOBODY)
+        (self.target / "logs").mkdir()
+        (self.target / "logs" / "Morvane.log").write_text(PRECIOUS)
+        self.logs.unlink()
+        self.logs.symlink_to("data/logs")
+        (self.work / "data").symlink_to(self.target)
+        os.chown(self.work / "data", NOBODY, NOBODY, follow_symlinks=False)
+        self.assert_refused(self.morvane(), NO_LOG, f"./MorvaneLogs: a link that user {NOBODY} made")
+        self.assertEqual((self.target / "logs" / "Morvane.log").read_text(), PRECIOUS)
+
+    def test_may_be_a_link_to_a_link_of_the_users_own(self):
         self.link_logs(ROOT, ROOT)
         (self.work / "second").symlink_to(self.target)
         self.logs.unlink()
         self.logs.symlink_to("second")
-        self.assert_refused(self.morvane(), NO_LOG, "./MorvaneLogs: Not a directory")
-        self.assertEqual(os.listdir(self.target), [])
+        self.assert_complete(self.morvane())
+        self.assertEqual(os.listdir(self.target), ["Morvane.log"])
+
+    def test_is_no_link_that_leads_to_itself(self):
+        self.logs.unlink(missing_ok=True)
+        self.logs.symlink_to("MorvaneLogs")
+        self.assert_refused(self.morvane(), NO_LOG, "./MorvaneLogs: Too many levels of symbolic links")
 
     def test_is_no_file(self):
         self.logs.write_text(PRECIOUS)
@@ -129,6 +147,8 @@ class TheDirectory(Run):
         self.logs.unlink(missing_ok=True)
         self.logs.symlink_to(self.target)
         os.chown(self.logs, owner, owner, follow_symlinks=False)
+        self.work.chmod(0o755)
+        os.chown(self.work, user, user)
 
 
 class OneRunAfterAnother(Run):
@@ -150,12 +170,15 @@ class OneRunAfterAnother(Run):
                 self.assertEqual(oct(self.log.stat().st_mode), mode)
                 self.log.unlink()
 
-    def test_takes_the_write_permission_of_others_from_the_earlier_log(self):
+    def test_leaves_an_earlier_log_to_others_who_could_write_to_it(self):
         self.make_logs(ROOT)
         self.log.touch()
         self.log.chmod(0o666)
-        self.assert_complete(self.morvane())
+        with open(self.log, "r+b") as held:  # as somebody else may hold it
+            self.assert_complete(self.morvane())
+            held.write(b"forged")
         self.assertEqual(oct(self.log.stat().st_mode), "0o100644")
+        self.assertNotIn(b"forged", self.log.read_bytes())
 
 
 class DuringARun(Run):
@@ -170,12 +193,21 @@ class DuringARun(Run):
         self.assert_complete(done)
         first = (self.work / "first").read_text().strip()
         told = [(self.work / name).read_text() for name in ("status", "output", "error", "difference")]
-        self.assertEqual(told, ["1\n", NO_LOG.decode(), "morvane: ./MorvaneLogs: another run is writing its log there "
-                                f"(process {first})\n", ""])
+        self.assertEqual(told, ["1\n", NO_LOG.decode(), f"morvane: ./MorvaneLogs: locked by process {first}, "
+                                "as by a run that is writing its log there\n", ""])
 
     def test_a_log_that_is_replaced_is_not_called_complete(self):
         done = self.morvane(script=self.while_waiting("mv MorvaneLogs/Morvane.log mine; touch MorvaneLogs/Morvane.log"))
-        self.assert_refused(done, b"", "./MorvaneLogs/Morvane.log: replaced during the run")
+        self.assert_refused(done, b"", "./MorvaneLogs/Morvane.log: changed during the run by somebody else")
+
+    def test_a_log_that_is_cut_is_not_called_complete(self):
+        done = self.morvane(script=self.while_waiting(": >MorvaneLogs/Morvane.log"))
+        self.assert_refused(done, b"", "./MorvaneLogs/Morvane.log: changed during the run by somebody else")
+
+    def test_a_log_whose_directory_is_replaced_is_not_called_complete(self):
+        done = self.morvane(script=self.while_waiting("mv MorvaneLogs mine; mkdir MorvaneLogs; "
+                                                      "touch MorvaneLogs/Morvane.log"))
+        self.assert_refused(done, b"", "./MorvaneLogs/Morvane.log: changed during the run by somebody else")
 
     def test_a_log_that_is_removed_is_not_called_complete(self):
         done = self.morvane(script=self.while_waiting("rm MorvaneLogs/Morvane.log"))

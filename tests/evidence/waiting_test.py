@@ -113,7 +113,7 @@ class Terminal(Waiting):
         self.assertEqual(output, COMPLETED)
         self.assertEqual(shown.split(CLEAR), [b""] + [f"morvane: {text}".encode() for text in (
             "multipath: PowerPath",
-            "FC: loading the HBA library",
+            "FC: HBA library",
             "FC adapter: qlogic-qle2462-0 (1 of 2)",
             "FC vendors: /dev/sdb (1 of 2)",
             "FC vendors: /dev/sdc (2 of 2)",

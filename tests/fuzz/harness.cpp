@@ -78,6 +78,10 @@ CommandOutput::CommandOutput(const char* command) {
     }
 }
 
+CommandOutput::~CommandOutput() {
+    finish();
+}
+
 void CommandOutput::close() {
     finish();
 }

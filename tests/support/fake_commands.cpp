@@ -81,6 +81,10 @@ CommandOutput::CommandOutput(const char* command) {
     gOpenStreams.insert(mStream);
 }
 
+CommandOutput::~CommandOutput() {
+    finish();
+}
+
 void CommandOutput::close() {
     finish();
 }

@@ -22,11 +22,11 @@ const std::string kEveryCall = "load 0\n"
 
 class HbaLibrary : public testing::Test {
 protected:
-    // What the program does with these bytes as the library.
-    test::ProcessResult runWith(const std::string& bytes) {
+    // What the program does with these bytes as the library; env takes `option` besides.
+    test::ProcessResult runWith(const std::string& bytes, const std::string& option = "--default-signal") {
         std::ofstream(mScratch.path() / "libHBAAPI.so.2", std::ios::binary) << bytes;
         // A sanitizer is not to report the signal that a damaged file raises.
-        return test::runProcess({"/usr/bin/env", "LD_LIBRARY_PATH=" + mScratch.path().string(),
+        return test::runProcess({"/usr/bin/env", option, "LD_LIBRARY_PATH=" + mScratch.path().string(),
                                  "ASAN_OPTIONS=handle_sigbus=0:handle_segv=0:detect_leaks=0", PROBE_PROGRAM},
                                 mScratch.path());
     }
@@ -47,6 +47,19 @@ TEST_F(HbaLibrary, IsNotLoadedWhenItLacksAFunction) {
     EXPECT_EQ(result.error, "morvane: no Fibre Channel report: " + mScratch.path().string() +
                                 "/libHBAAPI.so.2: undefined symbol: HBA_GetFcpTargetMapping\n");
     EXPECT_EQ(result.status, 0);
+}
+
+TEST_F(HbaLibrary, IsNotLoadedWhenAFunctionOfItLeadsNowhere) {
+    const test::ProcessResult result = runWith(test::contentOf(NOWHERE_LIBRARY));
+    EXPECT_EQ(result.output, kNotLoaded);
+    EXPECT_EQ(result.error, "morvane: no Fibre Channel report: libHBAAPI.so.2 lacks a function\n");
+    EXPECT_EQ(result.status, 0);
+}
+
+TEST_F(HbaLibrary, IsLoadedWhereTheEndsOfChildrenAreIgnored) {
+    const test::ProcessResult result = runWith(test::contentOf(WHOLE_LIBRARY), "--ignore-signal=CHLD");
+    EXPECT_EQ(result.output, kEveryCall);
+    EXPECT_EQ(result.error, "");
 }
 
 TEST_F(HbaLibrary, IsNotLoadedWhenItIsEmpty) {

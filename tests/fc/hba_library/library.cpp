@@ -1,5 +1,5 @@
 // An HBA API library that answers every call in a way of its own. Built with LACKS_A_FUNCTION, it lacks the
-// last of them.
+// last of them; with LEADS_NOWHERE, that one's address is null.
 #include <cstdio>
 #include <cstring>
 
@@ -40,7 +40,9 @@ HBA_STATUS HBA_GetAdapterPortAttributes(HBA_HANDLE handle, HBA_UINT32 index, HBA
     return HBA_STATUS_ERROR_ILLEGAL_INDEX;
 }
 
-#ifndef LACKS_A_FUNCTION
+#ifdef LEADS_NOWHERE
+__asm__(".globl HBA_GetFcpTargetMapping\n.set HBA_GetFcpTargetMapping, 0");
+#elif !defined LACKS_A_FUNCTION
 HBA_STATUS HBA_GetFcpTargetMapping(HBA_HANDLE handle, HBA_FCPTARGETMAPPING* mapping) {
     mapping->NumberOfEntries += handle;
     return HBA_STATUS_ERROR_MORE_DATA;
