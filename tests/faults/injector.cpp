@@ -48,7 +48,7 @@ enum Kind : unsigned {
     kAllocation, // malloc, calloc, new
     kFileOpen,   // fopen
     kDeviceOpen, // open: devices, the log's directory
-    kLogOpen,    // openat: the log
+    kLogOpen,    // openat: the log, and each step to it
     kStream,     // fdopen: the log, a command's output
     kDirectoryOpen,
     kPipe,
@@ -227,6 +227,10 @@ int beginLog(int fd) {
     return moved;
 }
 
+bool isLog(const char* path) {
+    return std::strcmp(path, "Morvane.log") == 0;
+}
+
 void keepSaid(std::FILE* stream, const void* text, std::size_t length) {
     if (stream == gPlan.log && stream != nullptr) {
         static_cast<void>(!syscall(SYS_write, gPlan.said, text, length));
@@ -370,7 +374,11 @@ int openat(int directory, const char* path, int flags, ...) {
     va_start(arguments, flags);
     const mode_t mode = (flags & O_CREAT) != 0 ? va_arg(arguments, mode_t) : 0;
     va_end(arguments);
-    return OWN_CALL_FAILS(kLogOpen) ? failWith(ENFILE) : beginLog(kReal(directory, path, flags, mode));
+    if (OWN_CALL_FAILS(kLogOpen)) {
+        return failWith(ENFILE);
+    }
+    const int fd = kReal(directory, path, flags, mode);
+    return isLog(path) ? beginLog(fd) : fd;
 }
 
 int openat64(int directory, const char* path, int flags, ...) {
@@ -379,7 +387,11 @@ int openat64(int directory, const char* path, int flags, ...) {
     va_start(arguments, flags);
     const mode_t mode = (flags & O_CREAT) != 0 ? va_arg(arguments, mode_t) : 0;
     va_end(arguments);
-    return OWN_CALL_FAILS(kLogOpen) ? failWith(ENFILE) : beginLog(kReal(directory, path, flags, mode));
+    if (OWN_CALL_FAILS(kLogOpen)) {
+        return failWith(ENFILE);
+    }
+    const int fd = kReal(directory, path, flags, mode);
+    return isLog(path) ? beginLog(fd) : fd;
 }
 
 std::FILE* fdopen(int fd, const char* mode) noexcept {
