@@ -8,7 +8,7 @@
 namespace view {
 
 Trouble troubleWith(const std::string& path, const std::string& reason) {
-    return Trouble(printable(path) + ": " + reason);
+    return Trouble{printable(path) + ": " + reason};
 }
 
 Trouble systemTrouble(const std::string& path) {

@@ -32,32 +32,32 @@ Function* next(const char* name) {
 extern "C" {
 
 int putenv(char* text) noexcept {
-    static auto* const real = next<int(char*)>("putenv");
-    return fails(gFailingCalls.putenv) ? -1 : real(text);
+    static auto* const kReal = next<int(char*)>("putenv");
+    return fails(gFailingCalls.putenv) ? -1 : kReal(text);
 }
 
 time_t time(time_t* result) noexcept {
-    static auto* const real = next<time_t(time_t*)>("time");
-    return fails(gFailingCalls.time) ? -1 : real(result);
+    static auto* const kReal = next<time_t(time_t*)>("time");
+    return fails(gFailingCalls.time) ? -1 : kReal(result);
 }
 
 char* ctime_r(const time_t* seconds, char* buffer) noexcept {
-    static auto* const real = next<char*(const time_t*, char*)>("ctime_r");
-    return fails(gFailingCalls.ctime_r) ? nullptr : real(seconds, buffer);
+    static auto* const kReal = next<char*(const time_t*, char*)>("ctime_r");
+    return fails(gFailingCalls.ctime_r) ? nullptr : kReal(seconds, buffer);
 }
 
 tm* gmtime_r(const time_t* seconds, tm* parts) noexcept {
-    static auto* const real = next<tm*(const time_t*, tm*)>("gmtime_r");
-    return fails(gFailingCalls.gmtime_r) ? nullptr : real(seconds, parts);
+    static auto* const kReal = next<tm*(const time_t*, tm*)>("gmtime_r");
+    return fails(gFailingCalls.gmtime_r) ? nullptr : kReal(seconds, parts);
 }
 
 tm* localtime_r(const time_t* seconds, tm* parts) noexcept {
-    static auto* const real = next<tm*(const time_t*, tm*)>("localtime_r");
-    return fails(gFailingCalls.localtime_r) ? nullptr : real(seconds, parts);
+    static auto* const kReal = next<tm*(const time_t*, tm*)>("localtime_r");
+    return fails(gFailingCalls.localtime_r) ? nullptr : kReal(seconds, parts);
 }
 
 int gettimeofday(timeval* result, void* zone) noexcept {
-    static auto* const real = next<int(timeval*, void*)>("gettimeofday");
+    static auto* const kReal = next<int(timeval*, void*)>("gettimeofday");
     if (fails(gFailingCalls.gettimeofday)) {
         return -1;
     }
@@ -65,12 +65,12 @@ int gettimeofday(timeval* result, void* zone) noexcept {
         *result = *gFailingCalls.now;
         return 0;
     }
-    return real(result, zone);
+    return kReal(result, zone);
 }
 
 char* strdup(const char* text) noexcept {
-    static auto* const real = next<char*(const char*)>("strdup");
-    return fails(gFailingCalls.strdup) ? nullptr : real(text);
+    static auto* const kReal = next<char*(const char*)>("strdup");
+    return fails(gFailingCalls.strdup) ? nullptr : kReal(text);
 }
 }
 // NOLINTEND(readability-inconsistent-declaration-parameter-name)

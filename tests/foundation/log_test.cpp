@@ -91,7 +91,7 @@ TEST(LogText, TakesTextsOfAnyLength) {
         const std::string string(length, 'x');
         LogText text;
         text.text("a").string(string.c_str()).text("b").string(string.c_str()).text("c").write();
-        EXPECT_EQ(log.exactText(), "a" + string + "b" + string + "c");
+        EXPECT_EQ(log.exactText(), std::string("a").append(string).append("b").append(string).append("c"));
     }
 }
 

@@ -78,6 +78,7 @@ CommandOutput::CommandOutput(const char* command) {
     output->run = std::move(run);
     mStream = fopencookie(output.release(), "r",
                           {.read = readOutput, .write = nullptr, .seek = nullptr, .close = closeOutput});
+    mProcess = 0; // none to be waited for
     gOpenStreams.insert(mStream);
 }
 
