@@ -26,6 +26,7 @@ cmd_package() {
     need "${run_packages[@]}" "${view_packages[@]}" "${package_packages[@]}"
     SOURCE_DATE_EPOCH=$(git log -1 --format=%ct) # the same sources make the same packages
     export SOURCE_DATE_EPOCH
+    umask 022 # as the folders in a package are to be
     rm -rf build/packages
     local preset depends view_depends
     for preset in release i386; do
