@@ -572,6 +572,14 @@ TEST_F(IscsiTree, LetsALogThatIsFullOut) {
               "File write failed\n");
 }
 
+TEST_F(IscsiTree, ClosesTheListingWhenTheLogIsFull) {
+    mCommands.answer(kSessionCommand, "Target: iqn.a\n");
+    const RefusingLog log(6); // the lines up to the entry of the first line of the listing
+    EXPECT_THROW(BuildIscsiTree_Linux(), WriteFailedEx);
+    EXPECT_EQ(mCommands.runs(), std::vector<std::string>{kSessionCommand});
+    EXPECT_EQ(FakeCommands::openStreams(), 0U);
+}
+
 // The two text routines.
 
 TEST(SkipBlanks, StopsAtTheFirstThatIsNeitherSpaceNorTab) {

@@ -208,6 +208,16 @@ TEST_F(IoContext, DataOutSendsTheCallersBytes) {
     EXPECT_EQ(header.sb_len_wr, 32);
 }
 
+TEST_F(IoContext, DataOutKeepsTheCallersBytes) {
+    const Buffer cdb = responseOf({0x3B, 0, 0, 0, 0, 0, 0, 0, 4, 0}, 10);
+    Buffer data = responseOf({1, 2, 3, 4}, 4);
+    mContext.addDataOutScsiCdb(cdb, data);
+    const LogCapture log;
+    data.release();
+    EXPECT_EQ(log.text(), ""); // the buffer lives on
+    EXPECT_EQ(static_cast<const uint8*>(mRecord->header.dxferp)[3], 4);
+}
+
 TEST_F(IoContext, StatusIsThereOnlyAfterTheIoctl) {
     for (const uint32 state : {kIoctlNotDone, kIoctlFailed}) {
         SCOPED_TRACE(state);
