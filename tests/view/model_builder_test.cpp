@@ -1,5 +1,8 @@
 #include "view/read/model_builder.hpp"
 
+#include <cstddef>
+#include <iomanip>
+#include <sstream>
 #include <string>
 #include <vector>
 
@@ -62,6 +65,87 @@ TEST(ModelBuilder, JoinsThePartsOfAnFcPath) {
         R"("device":"/dev/sdb","lun":4,"fcId":66049,"fcpLun":"4","identifier":"6","identifierKind":"naa",)"
         R"("vendor":"DISKCO","product":"ARRAY 9","revision":"1.0","pseudoDevice":"emcpowera"}]})");
     EXPECT_EQ(problemsOf(model), Lines());
+}
+
+// A dump, as the log has it.
+std::string dump(const std::vector<unsigned>& bytes) {
+    std::ostringstream text;
+    text << "Going to dump " << bytes.size() << " bytes\n" << std::hex;
+    for (std::size_t i = 0; i < bytes.size(); ++i) {
+        text << "Byte " << std::dec << i << ": 0x" << std::hex << bytes[i];
+    }
+    return text.str() + '\n';
+}
+
+// What the log has of the two commands that read page 83h: their CDBs, and the dumps of what came back. A
+// page of four bytes has an empty list of designators.
+std::string page83Read(const std::vector<unsigned>& page) {
+    const std::vector<unsigned> header(page.begin(), page.begin() + 4);
+    const std::string cdb = "SCSI Inquiry CDB Dump:" + dump({0x12, 1, 0x83, 0, 4, 0});
+    return cdb + "Going to dump the DI VPD page heder\n" + dump(header) +
+           (page.size() > 4 ? cdb + "Going to dump entire DI VPD page\n" + dump(page) : "");
+}
+
+// The bytes of an answer in hexadecimal; "not read" when there is none.
+std::string shown(const view::Page83& page83) {
+    std::ostringstream text;
+    text << std::hex << std::setfill('0');
+    if (page83 == nullptr) {
+        return "not read";
+    }
+    for (const unsigned byte : *page83) {
+        text << std::setw(2) << byte;
+    }
+    return text.str();
+}
+
+const std::string kIdentification = "Entered Function HA_GetScsiUniqueLunId Line 1\nGet LunID\n";
+
+TEST(ModelBuilder, KeepsThePage83OfEachFcPathAndOfALunThatTheTreeDoesNotList) {
+    const auto lun = [](const std::string& device, unsigned number) {
+        return "Added to DevMap 12 --> " + device + " --> 1\n" + kIdentification +
+               page83Read({0, 0x83, 0, 5, 1, 3, 0, 1, number}) + dump({1, 3, 0, 1, number}) +
+               "UniqueLunid = 6 size = 1\n";
+    };
+    const Model model =
+        modelOf(kRunStart + kFcBanner + kOpening + lun("/dev/sdb", 0x6b) + lun("/dev/sdc", 0x6c) +
+                kAdapterLines + kTargetLine + lunLine("", "", "0") + lunLine("/dev/sdb", "6") +
+                "|  |_ Initiator wwpn 10:02\n" + kTargetLine + lunLine("/dev/sdb", "6") + kRunEnd);
+    ASSERT_EQ(model.fc.paths.size(), 2);
+    EXPECT_EQ(shown(model.fc.paths[0].page83), "00830005010300016b");
+    EXPECT_EQ(model.fc.paths[1].page83, model.fc.paths[0].page83);
+    EXPECT_EQ(shown(model.fc.adapters.at(0).unlisted.at(0).page83), "00830005010300016c");
+}
+
+TEST(ModelBuilder, KeepsThePage83OfEachIscsiPath) {
+    const auto path = [](const std::string& device) {
+        return "Register new iSCSI path: init_wwnn=i, init_wwpn=a, tgt_wwnn=t, tgt_wwpn=b, lun=1\n"
+               "|_ Initiator IQN  i\n|  |_ Target IQN t\n         a <---> b\n"
+               "|  |  |  |_ Device_Name: " +
+               device + " sScsiOSLun: 1 LunId: 6\n";
+    };
+    const Model model =
+        modelOf(kRunStart + kIscsiBanner + "Target IQN 't'\n" + "Added to DevMap 12 --> /dev/sdb --> 4\n" +
+                kIdentification + page83Read({0, 0x83, 0, 5, 1, 3, 0, 1, 0x6b}) + path("/dev/sdb") +
+                "Added to DevMap 12 --> /dev/sdc --> 4\n" + kIdentification + path("/dev/sdc") + kRunEnd);
+    ASSERT_EQ(model.iscsi.paths.size(), 2);
+    EXPECT_EQ(shown(model.iscsi.paths[0].page83), "00830005010300016b");
+    EXPECT_EQ(shown(model.iscsi.paths[1].page83), "not read");
+}
+
+TEST(ModelBuilder, TellsAnEmptyPage83AndAPartOfOneFromOneThatWasNotRead) {
+    const Model model = modelOf(
+        kRunStart + kDasBanner + kIdentification + page83Read({0, 0x83, 0, 5, 1, 3, 0, 1, 0x6b}) +
+        diskLine("/dev/sda", "6B") + kIdentification + page83Read({0, 0x83, 0, 0}) +
+        diskLine("/dev/sdb", "host::/dev/sdb") + kIdentification + diskLine("/dev/sdc", "host::/dev/sdc") +
+        kIdentification + "Going to dump entire DI VPD page\nGoing to dump 9 bytes\n" +
+        "Byte 0: 0x0Byte 1: 0x83Byte 7: 0x1\nByte 2: 0x0\n" + diskLine("/dev/sdd", "host::/dev/sdd") +
+        kRunEnd);
+    ASSERT_EQ(model.direct.devices.size(), 4);
+    EXPECT_EQ(shown(model.direct.devices[0].page83), "00830005010300016b");
+    EXPECT_EQ(shown(model.direct.devices[1].page83), "00830000");
+    EXPECT_EQ(shown(model.direct.devices[2].page83), "not read");
+    EXPECT_EQ(shown(model.direct.devices[3].page83), "008300");
 }
 
 TEST(ModelBuilder, ReadsAnFcTreeWhoseProgressIsMissing) {

@@ -2,6 +2,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -79,6 +80,12 @@ struct DeviceFacts {
     std::string pseudoDevice; // PowerPath's name of the LUN
 };
 
+// VPD page 83h (SPC, device identification) as a device answered it, its header included: what the log dumps
+// of it, at most as much as the header's length says. The header's four bytes alone when the list of
+// designators is empty or could not be read; null when the log has no answer. The paths that repeat one
+// answer share it. Of standard INQUIRY data the log dumps nothing; it tells what DeviceFacts hold.
+using Page83 = std::shared_ptr<const std::vector<std::uint8_t>>;
+
 // An FC path as the tree lists it: one LUN entry below one initiator port.
 struct FcPath {
     std::size_t adapter = 0; // index into FcTree::adapters
@@ -93,6 +100,7 @@ struct FcPath {
     std::uint64_t fcId = 0;
     std::string fcpLun; // the low 32 bits, hexadecimal
     DeviceFacts facts;
+    Page83 page83;
 };
 
 // Both LUN numbers of a path as one text. Either alone may be the same for all LUNs of a target: a library
@@ -106,6 +114,7 @@ struct UnlistedLun {
     std::string device;
     Identifier identifier;
     DeviceFacts facts;
+    Page83 page83;
 };
 
 enum class AdapterState : unsigned char {
@@ -152,6 +161,7 @@ struct IscsiPath {
     std::string device;
     std::int64_t lun = 0;
     Identifier identifier;
+    Page83 page83;
 };
 
 struct IscsiTree {
@@ -162,6 +172,7 @@ struct IscsiTree {
 struct DirectDevice {
     std::string device;
     Identifier identifier;
+    Page83 page83;
 };
 
 struct DirectTree {

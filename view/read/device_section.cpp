@@ -37,7 +37,8 @@ void DeviceSection::take(const TextMatch& match) {
 }
 
 void DeviceSection::addDirect(const TextMatch& match) {
-    DirectDevice direct{text(match.fields[0]), {text(match.fields[1]), mInquiry.chosen()}};
+    DirectDevice direct{
+        text(match.fields[0]), {text(match.fields[1]), mInquiry.chosen()}, mInquiry.takePage83()};
     mInquiry.sayLineEnds(direct.device);
     const std::string ending = "::" + direct.device;
     if (direct.identifier.text.ends_with(ending)) {

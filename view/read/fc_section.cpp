@@ -148,7 +148,7 @@ void FcSection::addIdentified(const TextMatch& match) {
     OpenAdapter& opened = open();
     const std::string& device = mInquiry.device();
     mInquiry.sayLineEnds(device);
-    UnlistedLun lun{device, {text(match.fields[0]), mInquiry.chosen()}, {}};
+    UnlistedLun lun{device, {text(match.fields[0]), mInquiry.chosen()}, {}, mInquiry.takePage83()};
     if (opened.identityPass > 0 && opened.identityPass <= opened.vendorPass.size()) {
         lun.facts = opened.vendorPass[opened.identityPass - 1];
     }
@@ -178,6 +178,7 @@ void FcSection::addListed(const TextMatch& match) {
     if (isKnown) {
         path.identifier.kind = opened.identified[known->second].identifier.kind;
         path.facts = opened.identified[known->second].facts;
+        path.page83 = opened.identified[known->second].page83;
     }
     mDraft.model.fc.paths.push_back(std::move(path));
 }

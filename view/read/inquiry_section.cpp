@@ -115,6 +115,37 @@ void InquirySection::take(const TextMatch& match) {
     }
 }
 
+void InquirySection::takeDump(const TextMatch& match) {
+    Dumping& dumping = mAnswers.dumping;
+    std::vector<std::uint8_t>& page = mAnswers.page83;
+    switch (match.text) {
+    case Text::PageDump:
+        page.clear();
+        dumping = Dumping::PageNext;
+        break;
+    case Text::Dump:
+        dumping = dumping == Dumping::PageNext ? Dumping::Page : Dumping::Other;
+        if (dumping == Dumping::Page) {
+            mAnswers.page83Length = toNumber<std::size_t>(match.fields[0]);
+        }
+        break;
+    case Text::DumpByte: // what is out of its turn is none of the page's bytes
+        if (dumping == Dumping::Page && page.size() < mAnswers.page83Length &&
+            toNumber<std::size_t>(match.fields[0]) == page.size()) {
+            page.push_back(static_cast<std::uint8_t>(hexToNumber(match.fields[1])));
+        }
+        break;
+    default:
+        break;
+    }
+}
+
+Page83 InquirySection::takePage83() {
+    std::vector<std::uint8_t> page = std::exchange(mAnswers.page83, {});
+    page.shrink_to_fit();
+    return page.empty() ? nullptr : std::make_shared<const std::vector<std::uint8_t>>(std::move(page));
+}
+
 void InquirySection::takeFailure(const TextMatch& match) {
     const auto* const failure = std::find_if(kFailures.begin(), kFailures.end(),
                                              [&](const Failure& known) { return known.text == match.text; });

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <cstddef>
+#include <cstdint>
 #include <set>
 #include <string>
 #include <string_view>
@@ -20,6 +22,9 @@ public:
     // Takes a text of Section::Inquiry.
     void take(const TextMatch& match);
 
+    // Takes a text that no section has to itself: of a dump of page 83h it keeps the bytes.
+    void takeDump(const TextMatch& match);
+
     // Forgets everything but the device: the next identification begins.
     void begin() { mAnswers = {}; }
 
@@ -33,6 +38,9 @@ public:
 
     // Where the identifier came from.
     [[nodiscard]] IdentifierKind chosen() const { return mAnswers.chosen; }
+
+    // The answer to page 83h, as far as it has been dumped. The next one is null until there is another dump.
+    [[nodiscard]] Page83 takePage83();
 
     // Whether the log has a cause of its own for a failed identification.
     [[nodiscard]] bool hasCause() const { return !mAnswers.causes.empty(); }
@@ -52,6 +60,8 @@ public:
     [[nodiscard]] std::string cause(std::string_view device) const;
 
 private:
+    enum class Dumping : unsigned char { Other, PageNext, Page };
+
     struct Answers {
         std::vector<std::string> causes;
         std::string detail; // of the command under way: why it failed
@@ -61,6 +71,9 @@ private:
         bool lineEnds = false; // in a designator
         std::set<IdentifierKind> found;
         IdentifierKind chosen = IdentifierKind::Unknown;
+        std::vector<std::uint8_t> page83;
+        std::size_t page83Length = 0; // as its dump announces it
+        Dumping dumping = Dumping::Other;
     };
 
     void find(IdentifierKind kind, std::string_view designator);

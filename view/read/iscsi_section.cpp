@@ -40,8 +40,10 @@ void IscsiSection::take(const TextMatch& match) {
                        text(match.fields[3]),
                        mInquiry.device(),
                        toNumber<std::int64_t>(match.fields[4]),
+                       {},
                        {}};
-        mIdentified[mInquiry.device()] = {mInquiry.chosen(), mInquiry.cause(mInquiry.device())};
+        mIdentified[mInquiry.device()] = {mInquiry.chosen(), mInquiry.cause(mInquiry.device()),
+                                          mInquiry.takePage83()};
         break;
     case Text::IscsiIgnored:
         mDraft.problem(Severity::Problem, ProblemKind::DeviceIgnored, text(first), ignoredCause());
@@ -95,15 +97,15 @@ void IscsiSection::addPath(const TextMatch& match) {
     path.device = text(match.fields[0]);
     path.lun = toNumber<std::int64_t>(match.fields[1]);
     const auto found = mIdentified.find(path.device);
-    const auto [kind, cause] =
-        found == mIdentified.end() ? std::pair(IdentifierKind::Unknown, text(kNoCause)) : found->second;
+    const Identified identified = found == mIdentified.end() ? Identified() : found->second;
+    path.page83 = identified.page83;
     if (match.fields[2] == kInquiryFailed) {
         path.identifier.kind = IdentifierKind::None;
         mDraft.problem(Severity::Problem, ProblemKind::InquiryFailed,
                        path.device + " (LUN " + std::to_string(path.lun) + " of " + path.targetIqn + ")",
-                       "its identifier could not be read: " + cause);
+                       "its identifier could not be read: " + identified.cause);
     } else {
-        path.identifier = {text(match.fields[2]), kind};
+        path.identifier = {text(match.fields[2]), identified.kind};
     }
     mDraft.model.iscsi.paths.push_back(std::move(path));
 }

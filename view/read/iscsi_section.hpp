@@ -35,6 +35,13 @@ private:
         unsigned disks = 0;
     };
 
+    // What was learnt of a disk before its path is reported.
+    struct Identified {
+        IdentifierKind kind = IdentifierKind::Unknown;
+        std::string cause{kNoCause}; // why it has no identifier
+        Page83 page83;
+    };
+
     void addSession(const std::string& address);
     void addPath(const TextMatch& match);
     void stop();
@@ -43,10 +50,10 @@ private:
     Draft& mDraft;
     InquirySection& mInquiry;
     std::vector<Session> mSessions;
-    std::string mCause;    // why the tree was not begun
-    IscsiPath mAbove;      // fields of the lines above a device line
-    IscsiPath mRegistered; // fields of the last path that was registered
-    std::map<std::string, std::pair<IdentifierKind, std::string>> mIdentified; // by device: kind, cause
+    std::string mCause;                            // why the tree was not begun
+    IscsiPath mAbove;                              // fields of the lines above a device line
+    IscsiPath mRegistered;                         // fields of the last path that was registered
+    std::map<std::string, Identified> mIdentified; // by device
 };
 
 } // namespace view

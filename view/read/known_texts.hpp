@@ -22,7 +22,8 @@ enum class Section : unsigned char {
 enum class Text : unsigned char {
     Progress,
     OpenEnded,       // progress whose last field is foreign text: it runs up to the next trace line
-    Dump,            // the bytes of a dump follow
+    PageDump,        // the next dump is of page 83h, or of its header
+    Dump,            // the bytes of a dump follow: their number
     DumpByte,        // number, value
     AsciiDesignator, // the bytes just dumped are a descriptor, shown as text from here on
     TraceEntry,

@@ -39,6 +39,7 @@ bool writesIn(Section part, Tree tree) {
 void ModelBuilder::take(const TextMatch& match, std::uint64_t line) {
     mRun->draft.line = line;
     if (match.section == Section::Any) {
+        mRun->inquiry.takeDump(match);
         return;
     }
     if (match.text == Text::RunStart) {
