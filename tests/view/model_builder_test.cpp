@@ -294,7 +294,7 @@ TEST(ModelBuilder, KnowsADirectDiskByItsHostAndTheReason) {
                 diskLine("/dev/vda", "db1::/dev/vda") + kRunEnd);
     EXPECT_EQ(sectionOf(model, "direct"),
               R"({"state":"built","devices":[{"device":"/dev/vda","identifier":"db1::/dev/vda",)"
-              R"("identifierKind":"host-name"}]})");
+              R"("identifierKind":"host-name","names":null}]})");
     EXPECT_EQ(model.host, "db1");
     EXPECT_EQ(problemsOf(model),
               Lines{"note, direct, /dev/vda: known by the host's name only: the first INQUIRY failed "
@@ -346,7 +346,7 @@ TEST(ModelBuilder, TakesNoTextThatStandsInTheSectionOfAnother) {
                                 diskLine("/dev/sda", "7") + kFcBanner + kAdapterLines + kRunEnd);
     EXPECT_EQ(
         sectionOf(model, "direct"),
-        R"({"state":"built","devices":[{"device":"/dev/sda","identifier":"7","identifierKind":"unknown"}]})");
+        R"({"state":"built","devices":[{"device":"/dev/sda","identifier":"7","identifierKind":"unknown","names":null}]})");
     EXPECT_EQ(model.fc.adapters.size(), 1);
     EXPECT_EQ(
         problemsOf(model),

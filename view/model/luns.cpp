@@ -24,7 +24,7 @@ public:
     void addAll() {
         for (std::size_t i = 0; i < mModel.fc.paths.size(); ++i) {
             const FcPath& path = mModel.fc.paths[i];
-            add({Sighting::Place::FcPath, i, 0}, path.identifier, path.facts, path.device);
+            add({Sighting::Place::FcPath, i, 0}, path.identifier, path.facts, path.page83, path.device);
             addPlace(path.identifier.text, std::to_string(path.adapter) + ' ' + path.targetPort,
                      lunNumbers(path));
         }
@@ -32,13 +32,13 @@ public:
             const Adapter& adapter = mModel.fc.adapters[i];
             for (std::size_t k = 0; k < adapter.unlisted.size(); ++k) {
                 const UnlistedLun& lun = adapter.unlisted[k];
-                add({Sighting::Place::Unlisted, k, i}, lun.identifier, lun.facts, lun.device);
+                add({Sighting::Place::Unlisted, k, i}, lun.identifier, lun.facts, lun.page83, lun.device);
             }
         }
         for (std::size_t i = 0; i < mModel.iscsi.paths.size(); ++i) {
             const IscsiPath& path = mModel.iscsi.paths[i];
             if (path.identifier.kind != IdentifierKind::None) {
-                add({Sighting::Place::IscsiPath, i, 0}, path.identifier, {}, path.device);
+                add({Sighting::Place::IscsiPath, i, 0}, path.identifier, {}, path.page83, path.device);
                 addPlace(path.identifier.text,
                          path.initiatorPort + ' ' + path.targetIqn + ' ' + path.targetAddress,
                          std::to_string(path.lun));
@@ -47,7 +47,8 @@ public:
         for (std::size_t i = 0; i < mModel.direct.devices.size(); ++i) {
             const DirectDevice& direct = mModel.direct.devices[i];
             if (direct.identifier.kind != IdentifierKind::HostName) {
-                add({Sighting::Place::DirectDevice, i, 0}, direct.identifier, {}, direct.device);
+                add({Sighting::Place::DirectDevice, i, 0}, direct.identifier, {}, direct.page83,
+                    direct.device);
             }
         }
     }
@@ -72,12 +73,18 @@ public:
                          (lun.devices.size() == 1 ? " device carries" : " devices carry") +
                          " it: " + lun.notUnique,
                      0});
+            } else if (const auto odd = mOddDevice.find(identifier); odd != mOddDevice.end()) {
+                mModel.problems.push_back({Severity::Problem, ProblemKind::NamesDiffer, Tree::Run, identifier,
+                                           odd->second + " answers with other designators than " +
+                                               lun.devices.front() +
+                                               ": to multipath, the kernel or udev they are two LUNs",
+                                           0});
             }
         }
     }
 
 private:
-    void add(Sighting sighting, const Identifier& identifier, const DeviceFacts& facts,
+    void add(Sighting sighting, const Identifier& identifier, const DeviceFacts& facts, const Page83& page83,
              const std::string& device) {
         const auto [found, isNew] = mLunByIdentifier.try_emplace(identifier.text, mModel.luns.size());
         if (isNew) {
@@ -86,6 +93,12 @@ private:
             mModel.luns.back().facts = facts;
         }
         Lun& lun = mModel.luns[found->second];
+        if (lun.page83 == nullptr) {
+            lun.page83 = page83;
+        } else if (page83 != nullptr && page83 != lun.page83 && *page83 != *lun.page83 &&
+                   namesOf(page83, facts) != namesOf(lun.page83, facts)) {
+            mOddDevice.try_emplace(identifier.text, device);
+        }
         lun.sightings.push_back(sighting);
         if (mDevices.emplace(identifier.text + '\n' + device).second) {
             lun.devices.push_back(device);
@@ -105,9 +118,14 @@ private:
     std::unordered_set<std::string> mDevices;
     std::unordered_map<std::string, std::string> mLunByPlace;
     std::unordered_set<std::string> mShared;
+    std::unordered_map<std::string, std::string> mOddDevice; // by identifier: the first that has other names
 };
 
 } // namespace
+
+Names namesOf(const Page83& page83, const DeviceFacts& facts) {
+    return page83 == nullptr ? Names() : namesOf(*page83, facts.vendor, facts.product);
+}
 
 void groupLuns(Model& model) {
     LunGroups groups(model);

@@ -42,6 +42,7 @@ enum class ProblemKind : unsigned char {
     DeviceUnsupported,
     EntryIgnored,
     IdentifierNotUnique,
+    NamesDiffer,
     ForeignText,
 };
 
@@ -209,6 +210,7 @@ struct Sighting {
 struct Lun {
     Identifier identifier;
     DeviceFacts facts;
+    Page83 page83; // of the first sighting whose answer the log has
     std::vector<Sighting> sightings;
     // The host's device nodes for it, one a path: the FC tree repeats an adapter's LUNs below each of its
     // ports, but the kernel has one node for a path.

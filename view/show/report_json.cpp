@@ -1,6 +1,7 @@
 #include <string>
 #include <vector>
 
+#include "view/model/luns.hpp"
 #include "view/show/escape.hpp"
 #include "view/show/json.hpp"
 #include "view/show/json_values.hpp"
@@ -28,6 +29,23 @@ Json factsJson(const DeviceFacts& facts) {
             {"product", textOrNull(facts.product)},
             {"revision", textOrNull(facts.revision)},
             {"pseudoDevice", textOrNull(facts.pseudoDevice)}};
+}
+
+// What other programs call a device; null when the log does not have what it answered to page 83h.
+Json namesJson(const Page83& page83, const DeviceFacts& facts) {
+    if (page83 == nullptr) {
+        return nullptr;
+    }
+    const Names names = namesOf(page83, facts);
+    Json links = Json::array();
+    for (const std::string& link : names.links) {
+        links.push_back(nameOrNull(link));
+    }
+    return {{"multipath", nameOrNull(names.multipath)},
+            {"kernel", nameOrNull(names.kernel)},
+            {"scsiId", nameOrNull(names.scsiId)},
+            {"sg3Rules", nameOrNull(names.sg3Rules)},
+            {"links", std::move(links)}};
 }
 
 Json logJson(const LogFacts& log) {
@@ -137,6 +155,7 @@ Json directJson(const DirectTree& direct) {
     for (const DirectDevice& device : direct.devices) {
         Json json = {{"device", printable(device.device)}};
         json.update(identifierJson(device.identifier));
+        json["names"] = namesJson(device.page83, {});
         devices.push_back(std::move(json));
     }
     return {{"state", name(direct.state)}, {"devices", std::move(devices)}};
@@ -149,6 +168,7 @@ Json lunsJson(const Model& model) {
         json["unique"] = lun.notUnique.empty();
         json["notUnique"] = textOrNull(lun.notUnique);
         json.update(factsJson(lun.facts));
+        json["names"] = namesJson(lun.page83, lun.facts);
         json["pathCount"] = lun.devices.size();
         json["devices"] = texts(lun.devices);
         luns.push_back(std::move(json));

@@ -1,10 +1,12 @@
 #include <algorithm>
 #include <cstddef>
 #include <iomanip>
+#include <iterator>
 #include <map>
 #include <string_view>
 #include <utility>
 
+#include "view/model/luns.hpp"
 #include "view/model/path_view.hpp"
 #include "view/show/escape.hpp"
 #include "view/show/text.hpp"
@@ -65,6 +67,50 @@ void writeWarnings(std::ostream& output, const LogFacts& log, const Style& style
     }
 }
 
+// The names that other programs have for a device, each with what it is called so by: a name that several use
+// once, and of the links only those that no name tells.
+std::vector<std::pair<std::string, std::string>> nameLines(const Names& names) {
+    std::vector<std::pair<std::string, std::string>> lines;
+    const auto add = [&](const std::string& program, const std::string& name) {
+        const auto same =
+            std::find_if(lines.begin(), lines.end(), [&](const auto& line) { return line.second == name; });
+        if (name.empty()) {
+            return;
+        }
+        if (same == lines.end()) {
+            lines.emplace_back(program, name);
+        } else {
+            same->first += ", " + program;
+        }
+    };
+    const bool isOneUdevName = names.sg3Rules.empty() || names.sg3Rules == names.scsiId;
+    add("multipath", names.multipath);
+    add(isOneUdevName ? "udev" : "udev with sg3-utils", isOneUdevName ? names.scsiId : names.sg3Rules);
+    add("udev alone", isOneUdevName ? "" : names.scsiId);
+    add("kernel", names.kernel);
+    const std::size_t nameCount = lines.size();
+    for (const std::string& link : names.links) {
+        const std::string_view id = std::string_view(link).substr(link.find('-') + 1);
+        const auto tells = [&](const auto& line) {
+            return line.second == id ||
+                   (id.starts_with("0x") && line.second == "naa." + std::string(id.substr(2)));
+        };
+        if (std::none_of(lines.begin(), std::next(lines.begin(), static_cast<std::ptrdiff_t>(nameCount)),
+                         tells)) {
+            lines.emplace_back("by-id", link);
+        }
+    }
+    return lines;
+}
+
+void writeNames(std::ostream& output, const Names& names) {
+    Columns columns;
+    for (const auto& [program, name] : nameLines(names)) {
+        columns.add({program, printable(name)});
+    }
+    columns.write(output, "    ");
+}
+
 void writeLuns(std::ostream& output, const Model& model, const Style& style) {
     if (model.luns.empty()) {
         return;
@@ -84,6 +130,7 @@ void writeLuns(std::ostream& output, const Model& model, const Style& style) {
             output << "  " << style.problem << "NOT UNIQUE" << style.end;
         }
         output << '\n';
+        writeNames(output, namesOf(lun.page83, lun.facts));
         Columns columns;
         for (const Sighting& sighting : lun.sightings) {
             const PathView path = describe(model, sighting);
@@ -215,9 +262,14 @@ void writeDevices(std::ostream& output, const Model& model, const Style& style) 
                      model.direct.state);
     Columns columns;
     for (const DirectDevice& direct : model.direct.devices) {
-        columns.add({printable(direct.device), direct.identifier.kind == IdentifierKind::HostName
-                                                   ? "no identifier of its own"
-                                                   : printable(direct.identifier.text)});
+        const bool isHostName = direct.identifier.kind == IdentifierKind::HostName;
+        columns.add({printable(direct.device),
+                     isHostName ? "no identifier of its own" : printable(direct.identifier.text)});
+        if (isHostName) {
+            for (const auto& [program, name] : nameLines(namesOf(direct.page83, {}))) {
+                columns.add({"", program + "  " + printable(name)});
+            }
+        }
     }
     columns.write(output, "  ");
 

@@ -43,7 +43,7 @@ std::string_view name(Severity severity) {
 }
 
 std::string_view name(ProblemKind kind) {
-    static constexpr std::array<std::string_view, 20> kNames = {
+    static constexpr std::array<std::string_view, 21> kNames = {
         "log-cut",
         "assertion-failed",
         "tree-ended",
@@ -63,6 +63,7 @@ std::string_view name(ProblemKind kind) {
         "device-unsupported",
         "entry-ignored",
         "identifier-not-unique",
+        "names-differ",
         "foreign-text",
     };
     return pick(kNames, kind);
