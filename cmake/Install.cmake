@@ -63,7 +63,7 @@ set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
 morvane_install(morvane ${CMAKE_INSTALL_SBINDIR} docs/morvane.8)
 install(FILES README.md DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane COMPONENT morvane)
 file(GLOB documents CONFIGURE_DEPENDS docs/*.md docs/*.svg)
-list(REMOVE_ITEM documents ${CMAKE_SOURCE_DIR}/docs/fleet.md) # morvane-view's
+list(REMOVE_ITEM documents ${CMAKE_SOURCE_DIR}/docs/fleet.md ${CMAKE_SOURCE_DIR}/docs/identity.md) # morvane-view's
 install(FILES ${documents} DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane/docs COMPONENT morvane)
 
 set(CPACK_COMPONENTS_ALL morvane)
@@ -85,7 +85,7 @@ if(TARGET morvane-view)
   install(FILES view/morvane-view.bash DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
     RENAME morvane-view COMPONENT morvane-view)
   install(FILES view/morvane-log.schema.json DESTINATION ${CMAKE_INSTALL_DATADIR}/morvane-view COMPONENT morvane-view)
-  install(FILES docs/fleet.md docs/view.png
+  install(FILES docs/fleet.md docs/identity.md docs/view.png
     DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane-view COMPONENT morvane-view)
 
   list(APPEND CPACK_COMPONENTS_ALL morvane-view)

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 """Checks every excerpt of the documents against a run of the program on the simulated host that it names.
 
-usage: quoted_lines.py SIMHOST MORVANE DOCUMENT...
+usage: quoted_lines.py SIMHOST MORVANE MORVANE-VIEW DOCUMENT...
 
 An excerpt is a fenced block (Markdown) or a .Bd display (manual page) behind one of these marks, which stands on the
 fence or in a comment on the line before the display:
@@ -10,6 +10,7 @@ fence or in a comment on the line before the display:
     log HOST prefix     likewise, but the lines may go on
     log HOST nobody     likewise, of a run as an unprivileged user
     output HOST         the whole standard output
+    view HOST           like log, of what morvane-view says of the log
 
 Blanks at the ends of lines do not count.
 """
@@ -37,7 +38,7 @@ class Excerpt(NamedTuple):
 
 def markdown_excerpts(path: Path) -> Iterator[Excerpt]:
     text = path.read_text()
-    for match in re.finditer(r"^```(log|output) (\S+)(.*)\n((?:.*\n)*?)```$", text, re.MULTILINE):
+    for match in re.finditer(r"^```(log|output|view) (\S+)(.*)\n((?:.*\n)*?)```$", text, re.MULTILINE):
         line = text.count("\n", 0, match.start()) + 1
         yield Excerpt(f"{path.name}:{line}", match[1], match[2], tuple(match[3].split()), match[4].splitlines())
 
@@ -50,42 +51,44 @@ def unescaped(line: str) -> str:
 
 def manual_excerpts(path: Path) -> Iterator[Excerpt]:
     text = path.read_text()
-    for match in re.finditer(r'^\.\\" (log|output) (\S+)(.*)\n\.Bd .*\n((?:.*\n)*?)\.Ed$', text, re.MULTILINE):
+    for match in re.finditer(r'^\.\\" (log|output|view) (\S+)(.*)\n\.Bd .*\n((?:.*\n)*?)\.Ed$', text, re.MULTILINE):
         line = text.count("\n", 0, match.start()) + 1
         lines = [unescaped(quoted) for quoted in match[4].splitlines()]
         yield Excerpt(f"{path.name}:{line}", match[1], match[2], tuple(match[3].split()), lines)
 
 
 @cache
-def run(simhost: Path, morvane: Path, host: str, as_nobody: bool) -> tuple[list[str], list[str]]:
-    """The lines of the log and of standard output of one run."""
+def run(simhost: Path, morvane: Path, view: Path, host: str, as_nobody: bool) -> dict[str, list[str]]:
+    """The lines of the log, of standard output and of morvane-view's report of one run, by kind of excerpt."""
     with tempfile.TemporaryDirectory() as name:
         work = Path(name)
         work.chmod(0o777)
         program = Path(shutil.copy(morvane, work)) # where an unprivileged user finds it too
         command = [simhost, HOSTS / host / "host.toml", "--", *(AS_NOBODY if as_nobody else []), program]
         output = subprocess.run(command, cwd=work, stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, check=False).stdout
-        log = (work / "MorvaneLogs" / "Morvane.log").read_bytes()
-    return log.decode(errors="replace").split("\n"), output.decode(errors="replace").split("\n")
+        log = work / "MorvaneLogs" / "Morvane.log"
+        report = subprocess.run([view, log], stdout=subprocess.PIPE, check=True).stdout
+        texts = {"log": log.read_bytes(), "output": output, "view": report}
+    return {kind: text.decode(errors="replace").split("\n") for kind, text in texts.items()}
 
 
-def complaint(excerpt: Excerpt, simhost: Path, morvane: Path) -> str:
+def complaint(excerpt: Excerpt, simhost: Path, morvane: Path, view: Path) -> str:
     """What is wrong with an excerpt; empty when nothing is."""
     if not (HOSTS / excerpt.host / "host.toml").exists():
         return f"no simulated host {excerpt.host}"
-    log, output = run(simhost, morvane, excerpt.host, "nobody" in excerpt.options)
+    text = run(simhost, morvane, view, excerpt.host, "nobody" in excerpt.options)[excerpt.kind]
     quoted = [line.rstrip() for line in excerpt.lines]
     if excerpt.kind == "output":
-        actual = [line.rstrip() for line in output if line]
+        actual = [line.rstrip() for line in text if line]
         return "" if quoted == actual else f"standard output is {actual}"
-    rest = (line.rstrip() for line in log)
+    rest = (line.rstrip() for line in text)
     for line in quoted:
         if not any(actual == line or "prefix" in excerpt.options and actual.startswith(line) for actual in rest):
-            return f"not in the log of {excerpt.host}, or not in this order: {line!r}"
+            return f"not in the {excerpt.kind} of {excerpt.host}, or not in this order: {line!r}"
     return ""
 
 
-def main(simhost: str, morvane: str, *documents: str) -> int:
+def main(simhost: str, morvane: str, view: str, *documents: str) -> int:
     failures = 0
     for document in map(Path, documents):
         excerpts = list(manual_excerpts(document) if document.suffix[1:].isdigit() else markdown_excerpts(document))
@@ -93,7 +96,7 @@ def main(simhost: str, morvane: str, *documents: str) -> int:
             print(f"{document.name}: no excerpts")
             failures += 1
         for excerpt in excerpts:
-            wrong = complaint(excerpt, Path(simhost), Path(morvane))
+            wrong = complaint(excerpt, Path(simhost), Path(morvane), Path(view))
             if wrong:
                 print(f"{excerpt.place}: {wrong}")
                 failures += 1

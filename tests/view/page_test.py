@@ -88,6 +88,18 @@ class Page(unittest.TestCase):
         self.assertEqual(self.count("#picture .target"), len(targets) + own)
         self.assertEqual(self.count("#picture .lun[data-n]"), len(luns) + own)
 
+    def test_the_search_finds_a_lun_by_what_other_programs_call_it(self):
+        document = self.open(host_log("demo"))
+        names = document["luns"][0]["names"]
+        for name in {names["multipath"], names["kernel"], names["scsiId"], names["sg3Rules"], *names["links"]}:
+            self.browser.execute_script(
+                "const field = document.getElementById('search'); field.value = arguments[0];"
+                "field.form.requestSubmit()", name)
+            self.assertEqual(self.count("#luns tbody tr:not([hidden])"), 1, name)
+            self.assertIn(document["luns"][0]["identifier"], self.browser.execute_script(
+                "return document.querySelector('#luns tbody tr:not([hidden])').textContent"))
+        self.assertEqual(self.browser.get_log("browser"), [])
+
     def test_paper_shows_the_whole_picture_and_nothing_to_type_into(self):
         self.open(make_log.big(10000).bytes())
         self.browser.execute_cdp_cmd("Emulation.setEmulatedMedia", {"media": "print"})

@@ -18,7 +18,7 @@
   // Adds a LUN, which each host of `seenBy`, a list of {host, pathCount}, sees.
   function addLun(key, label, seenBy, doubt) {
     const lun = { key, label, vendor: null, product: null, pseudoDevice: null, seenBy, pathCount: pathCount(seenBy),
-      doubt: new Set(doubt), paths: [] };
+      doubt: new Set(doubt), names: new Map(), paths: [] };
     luns.set(key, lun);
     return lun;
   }
@@ -28,6 +28,18 @@
     const key = `device ${host.name} ${device}`;
     return (identifier !== null && luns.get(`id ${identifier}`)) || luns.get(key) ||
       addLun(key, device, [{ host: host.name, pathCount: 1 }]);
+  }
+
+  // Notes what other programs call a LUN: each name once, with the programs that use it.
+  function addNames(lun, names) {
+    const add = (name, program) => name !== null && lun.names.set(name, (lun.names.get(name) ?? new Set()).add(program));
+    add(names?.multipath ?? null, "multipath");
+    add(names?.scsiId ?? null, "udev");
+    add(names?.sg3Rules ?? null, "udev");
+    add(names?.kernel ?? null, "kernel");
+    for (const link of names?.links ?? []) {
+      add(link, "by-id");
+    }
   }
 
   function addPath(host, entry, kind, initiator, target, lunNumber) {
@@ -65,12 +77,19 @@
     for (const path of report.iscsi.paths) {
       addPath(host, path, "iSCSI", path.initiatorPort, `${path.targetIqn} ${path.targetAddress}`, path.lun);
     }
+    for (const entry of report.luns) {
+      const lun = luns.get(`id ${entry.identifier}`);
+      if (lun) {
+        addNames(lun, entry.names);
+      }
+    }
     for (const disk of report.direct.devices) {
+      addNames(lunOf(host, disk), disk.names);
       addPath(host, disk, "direct", "direct", "attached to the host", null);
     }
   }
   for (const lun of luns.values()) {
-    lun.words = [lun.label, lun.vendor, lun.product, lun.pseudoDevice,
+    lun.words = [lun.label, lun.vendor, lun.product, lun.pseudoDevice, ...lun.names.keys(),
       ...lun.paths.flatMap((path) => [path.device, path.initiator, path.target, path.host.name])]
       .filter(Boolean).map((word) => word.toLowerCase());
     lun.words = [...new Set(lun.words)];
@@ -280,6 +299,13 @@
       out.push(table("hosts", "Hosts", ["Host", "Log", "LUNs", "Problems", "PowerPath", "Whole"], hosts.map(({ name, report }) =>
         `<tr><td>${finder(name)}</td><td>${esc(report.log.name)}</td><td class="number">${report.luns.length}</td><td class="number">${report.problems.filter((p) => p.severity === "problem").length}</td><td>${esc(report.multipath.powerPath)}</td><td>${report.log.complete ? "yes" : '<span class="bad">no</span>'}</td></tr>`)));
     }
+    // Under the identifier, the names of multipath, udev and the kernel; the links, which hold mostly the same digits, are
+    // found by the search and shown on demand.
+    const namesHtml = (lun) => {
+      const list = (wanted) => [...lun.names].filter(([, programs]) => programs.has("by-id") === wanted);
+      const names = list(false).map(([name, programs]) => `${esc(name)} <i>${[...programs].join(", ")}</i>`);
+      return names.length ? `<div class="names" title="${esc(list(true).map(([link]) => link).join("\n"))}">${names.join("<br>")}</div>` : "";
+    };
     const perHost = (lun) => lun.seenBy.map((seen) => `${seen.host} ${seen.pathCount}`).join(", ");
     let number = 0;
     out.push(table("luns", "LUNs", ["Identifier", "Product", "Pseudo device", "Paths", ...(many ? ["Paths of each host"] : []), "Remark"],
@@ -287,7 +313,7 @@
         lun.row = `l${number++}`;
         const remark = [...lun.doubt].map((d) => `<span class="bad">not unique: ${esc(d)}</span>`).join("<br>") ||
           (many && lun.seenBy.length === 1 ? "one host only" : "");
-        return `<tr id="${lun.row}"><td class="key">${finder(lun.label)}</td><td>${esc([lun.vendor, lun.product].filter(Boolean).join(" "))}</td><td>${esc(lun.pseudoDevice)}</td><td class="number">${lun.pathCount}</td>${many ? `<td>${esc(perHost(lun))}</td>` : ""}<td>${remark}</td></tr>`;
+        return `<tr id="${lun.row}"><td class="key">${finder(lun.label)}${namesHtml(lun)}</td><td>${esc([lun.vendor, lun.product].filter(Boolean).join(" "))}</td><td>${esc(lun.pseudoDevice)}</td><td class="number">${lun.pathCount}</td>${many ? `<td>${esc(perHost(lun))}</td>` : ""}<td>${remark}</td></tr>`;
       })));
     number = 0;
     out.push(table("paths", "Listed paths", [...hostHead, "Device", "Over", "Initiator", "Target", "LUN", "Identifier"],

@@ -86,7 +86,7 @@ std::vector<std::pair<std::string, std::string>> nameLines(const Names& names) {
     const bool isOneUdevName = names.sg3Rules.empty() || names.sg3Rules == names.scsiId;
     add("multipath", names.multipath);
     add(isOneUdevName ? "udev" : "udev with sg3-utils", isOneUdevName ? names.scsiId : names.sg3Rules);
-    add("udev alone", isOneUdevName ? "" : names.scsiId);
+    add("scsi_id", isOneUdevName ? "" : names.scsiId);
     add("kernel", names.kernel);
     const std::size_t nameCount = lines.size();
     for (const std::string& link : names.links) {
