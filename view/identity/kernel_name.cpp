@@ -1,6 +1,3 @@
-#include <array>
-#include <cstdio>
-
 #include "view/identity/namers.hpp"
 
 namespace view {
@@ -13,9 +10,9 @@ unsigned priority(const Designator& designator) {
         return 0;
     }
     switch (designator.type) {
-    case Designator::ScsiName:
+    case Designator::kScsiName:
         return 9;
-    case Designator::Naa:
+    case Designator::kNaa:
         switch (designator.naaFormat) {
         case 6:
             return 8;
@@ -28,7 +25,7 @@ unsigned priority(const Designator& designator) {
         default:
             return 0;
         }
-    case Designator::Eui64:
+    case Designator::kEui64:
         switch (designator.length) {
         case 16:
             return 7;
@@ -39,7 +36,7 @@ unsigned priority(const Designator& designator) {
         default:
             return 0;
         }
-    case Designator::T10:
+    case Designator::kT10:
         return 1;
     default:
         return 0;
@@ -63,9 +60,10 @@ std::string escaped(const std::string& bytes) {
         } else if (c == '\0') {
             text += "\\0";
         } else {
-            std::array<char, 5> octal{};
-            std::snprintf(octal.data(), octal.size(), "\\%03o", static_cast<unsigned>(byte));
-            text += octal.data();
+            text += '\\';
+            for (const unsigned shift : {6U, 3U, 0U}) {
+                text += static_cast<char>('0' + ((byte >> shift) & 7U));
+            }
         }
     }
     return text;
@@ -90,17 +88,17 @@ std::string kernelName(const Page83Bytes& page) {
         }
         const std::size_t length =
             std::min(designator.length, page.size() - std::min(page.size(), designator.at));
-        const bool isText = designator.type == Designator::T10 || designator.type == Designator::ScsiName;
+        const bool isText = designator.type == Designator::kT10 || designator.type == Designator::kScsiName;
         if (isText && designator.length < bestLength) {
             continue;
         }
         best = rank;
         bestLength = designator.length;
-        if (designator.type == Designator::T10) {
+        if (designator.type == Designator::kT10) {
             name = "t10." + escaped(page.text(designator.at, length));
-        } else if (designator.type == Designator::ScsiName) {
+        } else if (designator.type == Designator::kScsiName) {
             name = upToNul(page.text(designator.at, length));
-        } else if (designator.type == Designator::Eui64) {
+        } else if (designator.type == Designator::kEui64) {
             name = "eui." + page.hex(designator.at, length);
         } else if (designator.length == 8 || designator.length == 16) {
             name = "naa." + page.hex(designator.at, length);

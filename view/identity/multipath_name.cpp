@@ -16,7 +16,7 @@ unsigned priority(const Page83Bytes& page, const Designator& designator) {
         return 0;
     }
     switch (designator.type) {
-    case Designator::Naa:
+    case Designator::kNaa:
         if (designator.length != (designator.naaFormat == 6 ? 16 : 8)) {
             return 0;
         }
@@ -32,13 +32,13 @@ unsigned priority(const Page83Bytes& page, const Designator& designator) {
         default:
             return 0;
         }
-    case Designator::Eui64:
+    case Designator::kEui64:
         return designator.length == 8 || designator.length == 12 || designator.length == 16 ? 4 : 0;
-    case Designator::ScsiName: {
+    case Designator::kScsiName: {
         const std::string prefix = page.text(designator.at, std::min(designator.length, kPrefix));
         return prefix == "eui." || prefix == "naa." || prefix == "iqn." ? 3 : 0;
     }
-    case Designator::T10:
+    case Designator::kT10:
         return designator.length >= 8 ? 2 : 0;
     default:
         return 0;
@@ -69,12 +69,12 @@ std::string withoutBlanks(std::string_view text) {
 std::string nameOf(const Page83Bytes& page, const Designator& designator) {
     const std::string text = page.text(designator.at, std::min(designator.length, kLongestDesignator));
     switch (designator.type) {
-    case Designator::ScsiName:
+    case Designator::kScsiName:
         if (text.starts_with("iqn.")) {
             return '8' + text.substr(kPrefix);
         }
         return (text.starts_with("eui.") ? '2' : '3') + lowerCase(text.substr(kPrefix));
-    case Designator::T10:
+    case Designator::kT10:
         return '1' + withoutBlanks(text);
     default:
         return std::to_string(designator.type) + page.hex(designator.at, designator.length);

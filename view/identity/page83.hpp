@@ -49,15 +49,15 @@ private:
 
 // A designator in a page.
 struct Designator {
-    enum CodeSet : unsigned char { Binary = 1, Ascii = 2, Utf8 = 3 };
-    enum Type : unsigned char { VendorSpecific = 0, T10 = 1, Eui64 = 2, Naa = 3, ScsiName = 8 };
+    enum CodeSet : unsigned char { kBinary = 1, kAscii = 2, kUtf8 = 3 };
+    enum Type : unsigned char { kVendorSpecific = 0, kT10 = 1, kEui64 = 2, kNaa = 3, kScsiName = 8 };
 
     std::size_t at = 0;     // its first byte, behind its header
     std::size_t length = 0; // as its header says
     unsigned codeSet = 0;
     unsigned type = 0;
     unsigned association = 0; // 0: the logical unit
-    unsigned naaFormat = 0;   // of type Naa: the first four bits (6: IEEE registered extended)
+    unsigned naaFormat = 0;   // of type kNaa: the first four bits (6: IEEE registered extended)
 
     // The one whose header stands at `offset` of `page`.
     static Designator read(const Page83Bytes& page, std::size_t offset);

@@ -20,18 +20,18 @@ struct Wanted {
 };
 
 constexpr auto kWanted = std::to_array<Wanted>({
-    {Designator::Naa, Designator::Binary, 6},
-    {Designator::Naa, Designator::Ascii, 6},
-    {Designator::Naa, Designator::Binary, 5},
-    {Designator::Naa, Designator::Ascii, 5},
-    {Designator::Naa, Designator::Binary, std::nullopt},
-    {Designator::Naa, Designator::Ascii, std::nullopt},
-    {Designator::Eui64, Designator::Binary, std::nullopt},
-    {Designator::Eui64, Designator::Ascii, std::nullopt},
-    {Designator::T10, Designator::Binary, std::nullopt},
-    {Designator::T10, Designator::Ascii, std::nullopt},
-    {Designator::VendorSpecific, Designator::Binary, std::nullopt},
-    {Designator::VendorSpecific, Designator::Ascii, std::nullopt},
+    {Designator::kNaa, Designator::kBinary, 6},
+    {Designator::kNaa, Designator::kAscii, 6},
+    {Designator::kNaa, Designator::kBinary, 5},
+    {Designator::kNaa, Designator::kAscii, 5},
+    {Designator::kNaa, Designator::kBinary, std::nullopt},
+    {Designator::kNaa, Designator::kAscii, std::nullopt},
+    {Designator::kEui64, Designator::kBinary, std::nullopt},
+    {Designator::kEui64, Designator::kAscii, std::nullopt},
+    {Designator::kT10, Designator::kBinary, std::nullopt},
+    {Designator::kT10, Designator::kAscii, std::nullopt},
+    {Designator::kVendorSpecific, Designator::kBinary, std::nullopt},
+    {Designator::kVendorSpecific, Designator::kAscii, std::nullopt},
 });
 
 std::string padded(std::string_view field, std::size_t width) {
@@ -41,8 +41,8 @@ std::string padded(std::string_view field, std::size_t width) {
 }
 
 bool fits(const Designator& designator, const Wanted& wanted) {
-    const std::size_t length = (designator.codeSet == Designator::Ascii ? 1 : 2) * designator.length + 2 +
-                               (designator.type == Designator::VendorSpecific ? kVendor + kProduct : 0);
+    const std::size_t length = (designator.codeSet == Designator::kAscii ? 1 : 2) * designator.length + 2 +
+                               (designator.type == Designator::kVendorSpecific ? kVendor + kProduct : 0);
     return designator.association == 0 && designator.type == wanted.type &&
            designator.codeSet == wanted.codeSet &&
            (!wanted.naaFormat || designator.naaFormat == *wanted.naaFormat) && length <= kMaximum;
@@ -62,28 +62,30 @@ std::optional<Designator> find(const Page83Bytes& page, const Wanted& wanted) {
 
 } // namespace
 
-ScsiIdName scsiIdName(const Page83Bytes& all, std::string_view vendor, std::string_view product) {
-    if (!all.isPage83()) {
+ScsiIdName scsiIdName(const Page83Bytes& page, std::string_view vendor, std::string_view product) {
+    if (!page.isPage83()) {
         return {};
     }
-    const Page83Bytes page = all.first(kAsked);
-    if (page.isBareIdentifier()) {
-        return {"3" + page.hex(Page83Bytes::kHeader, std::min<std::size_t>(page[3], (kMaximum - 3) / 2)), {}};
+    const Page83Bytes asked = page.first(kAsked);
+    if (asked.isBareIdentifier()) {
+        return {"3" + asked.hex(Page83Bytes::kHeader, std::min<std::size_t>(asked[3], (kMaximum - 3) / 2)),
+                {}};
     }
     for (const Wanted& wanted : kWanted) {
-        const std::optional<Designator> designator = find(page, wanted);
+        const std::optional<Designator> designator = find(asked, wanted);
         if (!designator) {
             continue;
         }
-        const std::string id = designator->codeSet == Designator::Ascii
-                                   ? upToNul(page.text(designator->at, designator->length))
-                                   : page.hex(designator->at, designator->length);
-        if (wanted.type == Designator::VendorSpecific) {
+        const std::string id = designator->codeSet == Designator::kAscii
+                                   ? upToNul(asked.text(designator->at, designator->length))
+                                   : asked.hex(designator->at, designator->length);
+        if (wanted.type == Designator::kVendorSpecific) {
             return vendor.empty() && product.empty()
                        ? ScsiIdName()
-                       : ScsiIdName{"0" + padded(vendor, kVendor) + padded(product, kProduct) + id, {}};
+                       : ScsiIdName{upToNul("0" + padded(vendor, kVendor) + padded(product, kProduct) + id),
+                                    {}};
         }
-        const std::size_t shown = wanted.type == Designator::Naa ? kWwn : 0;
+        const std::size_t shown = wanted.type == Designator::kNaa ? kWwn : 0;
         return {std::to_string(wanted.type) + id, id.substr(0, shown)};
     }
     return {};

@@ -81,33 +81,33 @@ std::string& naaOf(Found& found, unsigned format) {
 }
 
 void take(const Page83Bytes& page, const Designator& designator, Found& found) {
-    const bool isText = designator.codeSet == Designator::Ascii || designator.codeSet == Designator::Utf8;
+    const bool isText = designator.codeSet == Designator::kAscii || designator.codeSet == Designator::kUtf8;
     const std::string hex = page.hex(designator.at, designator.length);
     const std::string text = page.text(designator.at, designator.length);
     switch (designator.type) {
-    case Designator::VendorSpecific:
+    case Designator::kVendorSpecific:
         if (designator.length > 0) {
             found.vendorSpecific = isText ? encoded(shown(text)) : hex;
         }
         break;
-    case Designator::T10:
+    case Designator::kT10:
         found.t10 = isText ? encoded(shown(text)) : hex;
         if (isText && text.starts_with("ATA     ")) {
             found.ata = shown(text).substr(std::min<std::size_t>(shown(text).size(), 4));
         }
         break;
-    case Designator::Eui64:
+    case Designator::kEui64:
         if (!isText) {
             found.eui64 = hex;
         }
         break;
-    case Designator::Naa:
+    case Designator::kNaa:
         if (!isText) {
             naaOf(found, designator.naaFormat) = hex;
         }
         break;
-    case Designator::ScsiName:
-        if (designator.codeSet == Designator::Utf8) {
+    case Designator::kScsiName:
+        if (designator.codeSet == Designator::kUtf8) {
             found.scsiName = lineValue(upToNul(text));
         }
         break;
