@@ -6,6 +6,7 @@
 #include <iostream>
 #include <string>
 
+#include "view/read/log_bytes.hpp"
 #include "view/read/log_reader.hpp"
 #include "view/trouble.hpp"
 
@@ -45,25 +46,26 @@ Model openLog(const std::string& path) {
     try {
         Model model = read(path);
         if (model.log.bytes == 0) {
-            throw troubleWith(path, "the log is empty");
+            throw troubleWith(path, model.log.damage.empty()
+                                        ? "the log is empty"
+                                        : "the compressed file is cut off or damaged (" + model.log.damage +
+                                              "): nothing of it could be unpacked");
         }
         if (isMostlyKnown(model.log)) {
             return model;
         }
     } catch (const NotALog&) {
         // as one that was read to its end
+    } catch (const UnpacksTooFar&) {
+        throw troubleWith(path, "unpacks to thousands of times its size, which no log does; it is not read further");
     }
     throw troubleWith(path, "is not a Morvane log");
 }
 
 bool isLog(const std::string& path) {
-    constexpr std::size_t kBeginning = 1U << 16U;
     std::ifstream file(path, std::ios::binary);
-    std::string beginning(kBeginning, '\0');
-    file.read(beginning.data(), static_cast<std::streamsize>(beginning.size()));
-    beginning.resize(static_cast<std::size_t>(file.gcount()));
     LogReader reader(path);
-    reader.feed(beginning);
+    reader.feed(LogBytes(file).next());
     return isMostlyKnown(reader.finish().log);
 }
 

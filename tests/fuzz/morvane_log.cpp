@@ -19,9 +19,10 @@ namespace {
 
 using view::Model;
 
-Model readStream(std::string_view log) {
-    std::istringstream input{std::string(log)};
-    return view::readLog(input, "log");
+Model readWhole(std::string_view log) {
+    view::LogReader reader("log");
+    reader.feed(log);
+    return reader.finish();
 }
 
 Model readChunks(std::string_view log, const std::array<std::size_t, 2>& sizes) {
@@ -90,8 +91,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8* data, std::size_t size) {
     if (whole.isHopeless()) {
         return 0; // refused as a stream
     }
-    const std::vector<Model> reports = {readStream(log), readStream(half),
-                                        readStream(log.substr(half.size()))};
+    const std::vector<Model> reports = {readWhole(log), readWhole(half), readWhole(log.substr(half.size()))};
     const Model& report = reports.front();
     checkFacts(report.log, log);
     checkText(report);

@@ -2,8 +2,11 @@
 """Runs morvane-view on logs and checks what it says. usage: program_test.py MORVANE-VIEW SIMHOST MORVANE"""
 
 import base64
+import bz2
+import gzip
 import hashlib
 import json
+import lzma
 import os
 import pty
 import re
@@ -49,6 +52,86 @@ class CapturedPages(unittest.TestCase):
     def test_are_read_as_their_own_check_says(self):
         done = subprocess.run([PAGES / "check", MORVANE, SIMHOST, PROGRAM], capture_output=True, check=False, timeout=280)
         self.assertRegex(done.stdout.decode().splitlines()[-1], r"^\d+ agreed, 0 differ$", done.stdout.decode())
+
+
+# Each way to pack a log.
+PACKERS = {"gz": gzip.compress, "bz2": bz2.compress, "xz": lzma.compress,
+           "zst": lambda log: subprocess.run(["zstd", "-qc"], input=log, capture_output=True, check=True).stdout}
+
+
+class PackedLogs(unittest.TestCase):
+    def test_every_command_reads_them_as_the_logs_they_hold_whatever_their_names_are(self):
+        logs = [host_log(host) for host in ("demo", "fc-names")]
+        with tempfile.TemporaryDirectory() as folder:
+            def all_commands():
+                commands = [["a"], ["--json", "a"], ["--html", "page", "a"], ["diff", "a", "b"], ["san", "--json", "a", "b"]]
+                done = [run(*command, folder=folder) for command in commands]
+                return [(d.returncode, d.stdout, d.stderr) for d in done], (Path(folder) / "page").read_bytes()
+
+            def write(pack):
+                for name, log in zip("ab", logs):
+                    (Path(folder) / name).write_bytes(pack(log))
+
+            write(bytes)
+            expected = all_commands()
+            for kind, pack in PACKERS.items():
+                with self.subTest(kind):
+                    write(pack)
+                    self.assertEqual(all_commands(), expected)
+                    self.assertEqual(run("--json", "-", log=pack(logs[0])).stdout, run("--json", "-", log=logs[0]).stdout)
+
+    def test_of_several_members_are_read_as_one(self):
+        log = host_log("demo")
+        for kind, pack in PACKERS.items():
+            with self.subTest(kind):
+                self.assertEqual(report(pack(log[:5000]) + pack(log[5000:])), report(log))
+
+    def test_that_are_cut_or_damaged_are_shown_as_far_as_they_unpack_and_are_not_whole(self):
+        log = make_log.big(1000).bytes()
+        for kind, pack in PACKERS.items():
+            packed = pack(log)
+            for size in (len(packed) // 2, len(packed) - 1):
+                with self.subTest(f"{size} bytes of {kind}"):
+                    document = report(packed[:size])
+                    self.assertFalse(document["log"]["complete"])
+                    self.assertEqual(document["problems"][0]["kind"], "log-cut")
+                    self.assertRegex(document["problems"][0]["cause"], r"^the compressed file is cut off or damaged "
+                                     r"\(.+\): the report holds what could be unpacked$")
+                    self.assertGreater(document["log"]["bytes"], len(log) / 4)
+                    self.assertLessEqual(document["log"]["bytes"], len(log))
+            with self.subTest(f"the beginning of {kind}"):
+                done = run("-", log=packed[:20])
+                self.assertEqual((done.returncode, done.stdout), (2, b""))
+                self.assertRegex(done.stderr.decode(), r"^morvane-view: -: the compressed file is cut off or damaged "
+                                                       r"\(.+\): nothing of it could be unpacked\n$")
+
+    def test_that_unpack_to_much_more_than_a_log_does_are_given_up(self):
+        log = host_log("demo")
+        with tempfile.NamedTemporaryFile() as bomb:
+            with subprocess.Popen(["zstd", "-q"], stdin=subprocess.PIPE, stdout=bomb) as zstd:
+                for _ in range(2**30 // len(log)):
+                    zstd.stdin.write(log)
+            done = run(bomb.name)
+        self.assertEqual((done.returncode, done.stdout, done.stderr.decode()), (
+            2, b"", f"morvane-view: {bomb.name}: unpacks to thousands of times its size, which no log does; it is not "
+                    "read further\n"))
+
+    def test_of_something_else_are_no_logs(self):
+        for kind, pack in PACKERS.items():
+            with self.subTest(kind):
+                done = run("-", log=pack(b"something else\n" * 100))
+                self.assertEqual((done.returncode, done.stderr), (2, b"morvane-view: -: is not a Morvane log\n"))
+                done = run("-", log=pack(b""))
+                self.assertEqual((done.returncode, done.stderr), (2, b"morvane-view: -: the log is empty\n"))
+
+    def test_are_not_replaced_by_a_page(self):
+        for kind, pack in PACKERS.items():
+            with self.subTest(kind), tempfile.TemporaryDirectory() as folder:
+                path = Path(folder) / "page.html"
+                path.write_bytes(pack(host_log("demo")))
+                done = run("--html", path, "-", log=host_log("demo"))
+                self.assertEqual((done.returncode, done.stderr.decode()), (
+                    2, f"morvane-view: {path}: is a Morvane log; name another file to write to\n"))
 
 
 class Report(unittest.TestCase):

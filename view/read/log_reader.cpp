@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "view/model/luns.hpp"
+#include "view/read/log_bytes.hpp"
 
 namespace view {
 
@@ -93,13 +94,14 @@ bool LogReader::isHopeless() const {
                                   : foreign > kMostForeign + 16 * mFacts.knownBytes;
 }
 
-Model LogReader::finish() {
+Model LogReader::finish(std::string damage) {
     if (!mPartialLine.empty()) {
         takeLine(std::exchange(mPartialLine, {}));
     }
     mForeign = {}; // nothing of them is to come
     takeTexts(mHeld, false);
     mFacts.cutInLine = mIsInLine;
+    mFacts.damage = std::move(damage);
     mFacts.lines = mLine - (mIsInLine ? 0 : 1);
     Model model = mBuilder.finish(std::move(mFacts));
     groupLuns(model);
@@ -196,15 +198,14 @@ void LogReader::takeLineEnd() {
 
 Model readLog(std::istream& input, const std::string& name) {
     LogReader reader(name);
-    std::vector<char> buffer(256UL * 1024);
-    while (input) {
-        input.read(buffer.data(), static_cast<std::streamsize>(buffer.size()));
-        reader.feed({buffer.data(), static_cast<std::size_t>(input.gcount())});
+    LogBytes bytes(input);
+    for (std::string_view part = bytes.next(); !part.empty(); part = bytes.next()) {
+        reader.feed(part);
         if (reader.isHopeless()) {
             throw NotALog();
         }
     }
-    return reader.finish();
+    return reader.finish(bytes.damage());
 }
 
 } // namespace view

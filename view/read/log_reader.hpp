@@ -26,8 +26,9 @@ public:
     // known.
     [[nodiscard]] bool isHopeless() const;
 
-    // Ends the log and returns what it says. The reader is used up.
-    Model finish();
+    // Ends the log and returns what it says; `damage`: why it ends before its end, where it does. The reader
+    // is used up.
+    Model finish(std::string damage = {});
 
 private:
     void takeLine(std::string_view line);
@@ -50,7 +51,8 @@ private:
 // Thrown for input that is none of Morvane's logs.
 struct NotALog {};
 
-// Reads a whole stream. Throws NotALog as soon as it is hopeless, so that input without an end has one.
+// Reads a whole stream, packed or not. Throws NotALog as soon as it is hopeless, so that input without an end
+// has one; UnpacksTooFar.
 Model readLog(std::istream& input, const std::string& name);
 
 } // namespace view

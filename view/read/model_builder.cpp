@@ -108,6 +108,14 @@ Model ModelBuilder::finish(LogFacts facts) {
             {Severity::Problem, ProblemKind::LogCut, Tree::Run, "log",
              "its beginning is missing: the report holds only what stands behind it", 1});
     }
+    if (!facts.damage.empty()) {
+        draft.model.problems.insert( // the first: what was unpacked last may be damaged, too
+            draft.model.problems.begin(),
+            {Severity::Problem, ProblemKind::LogCut, Tree::Run, "log",
+             "the compressed file is cut off or damaged (" + facts.damage +
+                 "): the report holds what could be unpacked",
+             draft.line});
+    }
     if (mRun->misplacedTexts > 0) {
         draft.model.problems.push_back(
             {Severity::Problem, ProblemKind::ForeignText, Tree::Run, "log",
@@ -118,7 +126,7 @@ Model ModelBuilder::finish(LogFacts facts) {
     }
     facts.runs = mRuns;
     facts.beginsInside = mRuns == 0;
-    facts.complete = mRun->ended;
+    facts.complete = mRun->ended && facts.damage.empty();
     facts.leftoverTexts = mLeftoverTexts;
     draft.model.log = std::move(facts);
     return std::move(draft.model);
