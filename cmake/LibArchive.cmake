@@ -1,14 +1,27 @@
-# LibArchive::LibArchive, which unpacks logs. Linked statically, with the four libraries that have the formats of packed
-# logs: its shared library needs ten more, of forty megabytes, for formats that no log comes in.
+# LibArchive::LibArchive, which unpacks logs. The library itself is linked statically: the shared one needs ten more, of
+# forty megabytes, for formats that no log comes in. The four that have the formats of packed logs are part of every
+# Debian, and shared but in a portable build.
 add_library(LibArchive::LibArchive INTERFACE IMPORTED)
 foreach(name archive z bz2 lzma zstd)
-  if(CMAKE_SIZEOF_VOID_P EQUAL 4 AND NOT CMAKE_CROSSCOMPILING) # what ./dev unpacked, as libHBAAPI
-    file(GLOB LIBARCHIVE_${name} ${CMAKE_BINARY_DIR}/packages/*/usr/lib/i386-linux-gnu/lib${name}.a)
+  if(name STREQUAL "archive" OR MORVANE_PORTABLE)
+    set(file lib${name}.a)
   else()
-    find_library(LIBARCHIVE_${name} lib${name}.a)
+    set(file lib${name}.so)
   endif()
-  if(NOT LIBARCHIVE_${name})
-    message(FATAL_ERROR "No lib${name}.a: build with ./dev")
+  if(CMAKE_SIZEOF_VOID_P EQUAL 4 AND NOT MORVANE_PORTABLE)
+    # What ./dev unpacked, as libHBAAPI, in one folder for the run path.
+    string(REPLACE .so .so.* file ${file})
+    file(GLOB found ${CMAKE_BINARY_DIR}/packages/*/lib/i386-linux-gnu/${file}
+      ${CMAKE_BINARY_DIR}/packages/*/usr/lib/i386-linux-gnu/${file})
+    if(NOT found)
+      message(FATAL_ERROR "No 32-bit lib${name} in ${CMAKE_BINARY_DIR}/packages: build with ./dev build i386")
+    endif()
+    file(COPY ${found} DESTINATION ${CMAKE_BINARY_DIR}/packages/unpacking FOLLOW_SYMLINK_CHAIN)
+    list(GET found 0 first)
+    cmake_path(GET first FILENAME file)
+    set(LIBARCHIVE_${name} ${CMAKE_BINARY_DIR}/packages/unpacking/${file})
+  else()
+    find_library(LIBARCHIVE_${name} ${file} REQUIRED)
   endif()
   target_link_libraries(LibArchive::LibArchive INTERFACE ${LIBARCHIVE_${name}})
 endforeach()

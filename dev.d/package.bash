@@ -10,7 +10,7 @@ dependencies() {
     local preset=$1 program=$PWD/build/$1/$2 work arch=amd64 search=()
     if [ "$preset" = i386 ]; then
         arch=i386
-        local libraries=(libhbaapi2 libc6 libgcc-s1 libstdc++6)
+        local libraries=(libhbaapi2 libc6 libgcc-s1 libstdc++6 "${codec_packages[@]}")
         unpack_i386 "${libraries[@]}"
         search=("${libraries[@]/#/-S$PWD/build/i386/packages/}")
     fi
