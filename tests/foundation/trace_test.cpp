@@ -93,8 +93,8 @@ TEST(FunctionTrace, LogsTheExitBeforeItThrows) {
     const LogCapture log;
     const int line = __LINE__;
     const FunctionTrace trace("lookup");
-    EXPECT_EQ(messageOf<NotFoundEx>([&] { trace.fail<NotFoundEx>("Element not found\n"); }),
-              "Element not found\n");
+    const auto fail = [&] { trace.fail<NotFoundEx>("Element not found\n"); };
+    EXPECT_EQ(messageOf<NotFoundEx>(fail), "Element not found\n");
     EXPECT_EQ(log.exactText(), "Entered Function lookup Line " + std::to_string(line + 1) +
                                    "\nLeft Function lookup Line " + std::to_string(line + 2) + "\n");
 }
