@@ -9,7 +9,9 @@ set(CMAKE_CXX_COMPILER clang++-14)
 string(REGEX REPLACE "^ppc" "powerpc" name ${MORVANE_PROCESSOR}) # as the cross linkers are called
 set(CMAKE_CXX_COMPILER_TARGET ${name}-linux-gnu)
 set(CMAKE_STRIP /usr/bin/llvm-strip-14) # for every processor the same
-set(CMAKE_EXE_LINKER_FLAGS_INIT "-static-libstdc++ -static-libgcc") # the sysroot has no shared C++ runtime
+foreach(kind EXE MODULE) # the sysroot has no shared C++ runtime; a program that is all static takes no -no-pie
+  set(CMAKE_${kind}_LINKER_FLAGS_INIT "-static-libstdc++ -static-libgcc -Wno-unused-command-line-argument")
+endforeach()
 foreach(kind LIBRARY INCLUDE PACKAGE)
   set(CMAKE_FIND_ROOT_PATH_MODE_${kind} ONLY)
 endforeach()

@@ -24,8 +24,17 @@
 namespace simhost {
 namespace {
 
-constexpr std::uint32_t kIoctlNumber64 = 16; // on x86-64
-constexpr std::uint32_t kIoctlNumber32 = 54; // on i386
+// How seccomp names simhost's own architecture; a program of another one is of its 32-bit kind.
+#if defined(__x86_64__)
+constexpr std::uint32_t kOwnArchitecture = AUDIT_ARCH_X86_64;
+#elif defined(__aarch64__)
+constexpr std::uint32_t kOwnArchitecture = AUDIT_ARCH_AARCH64;
+#elif defined(__s390x__)
+constexpr std::uint32_t kOwnArchitecture = AUDIT_ARCH_S390X;
+#elif defined(__powerpc64__)
+constexpr std::uint32_t kOwnArchitecture = AUDIT_ARCH_PPC64LE;
+#endif
+constexpr std::uint32_t kIoctlNumber32 = 54; // on every architecture's 32-bit kind
 
 constexpr std::size_t kLongestCdb = 32; // the driver accepts no longer one
 constexpr std::uint32_t kInfoCheck = 1; // SG_INFO_CHECK: status, host status or driver status is not 0
@@ -76,15 +85,16 @@ bool deliver(pid_t process, const SgRequest& request, ScsiReply& reply) {
 
 FileDescriptor installSgIoFilter() {
     const auto at = [](std::size_t offset) { return static_cast<std::uint32_t>(offset); };
-    // Fields of the 64-bit arguments are read as their low, first, half: a request number has 32 bits.
+    // Of the 64-bit arguments the low half is read: a request number has 32 bits.
+    constexpr std::size_t kLowHalf = std::endian::native == std::endian::big ? 4 : 0;
     std::array<sock_filter, 10> program = {{
         BPF_STMT(BPF_LD | BPF_W | BPF_ABS, at(offsetof(seccomp_data, arch))),
-        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, AUDIT_ARCH_X86_64, 0, 2),
+        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, kOwnArchitecture, 0, 2),
         BPF_STMT(BPF_LD | BPF_W | BPF_ABS, at(offsetof(seccomp_data, nr))),
-        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, kIoctlNumber64, 2, 5),
+        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_ioctl, 2, 5),
         BPF_STMT(BPF_LD | BPF_W | BPF_ABS, at(offsetof(seccomp_data, nr))),
         BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, kIoctlNumber32, 0, 3),
-        BPF_STMT(BPF_LD | BPF_W | BPF_ABS, at(offsetof(seccomp_data, args[1]))),
+        BPF_STMT(BPF_LD | BPF_W | BPF_ABS, at(offsetof(seccomp_data, args[1]) + kLowHalf)),
         BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SG_IO, 0, 1),
         BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_USER_NOTIF),
         BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
@@ -126,7 +136,7 @@ Supervisor::Node* Supervisor::nodeOf(pid_t process, int descriptor) const {
 // Returns 0 or the error number that the ioctl fails with.
 int Supervisor::serve(const seccomp_notif& call, int initDescriptor) {
     const auto process = static_cast<pid_t>(call.pid);
-    const bool wide = call.data.arch == AUDIT_ARCH_X86_64;
+    const bool wide = call.data.arch == kOwnArchitecture;
     Node* node = nodeOf(process, static_cast<int>(call.data.args[0]));
     const auto request = readSgHeader(process, call.data.args[2], wide);
     std::array<std::uint8_t, kLongestCdb> bytes{};

@@ -8,6 +8,7 @@
 #include <sys/un.h>
 
 #include <algorithm>
+#include <array>
 #include <fstream>
 #include <map>
 
@@ -23,6 +24,11 @@ namespace fs = std::filesystem;
 // The new root is built here: the real /sys is the one directory that no simulated host shows, and it is
 // there on every Linux machine, so that no directory need be made for the purpose.
 const fs::path kBuildRoot = "/sys";
+
+// What Debian's loaders of the word size put for $LIB; the 32-bit ones of multilib and i386 packages.
+constexpr std::array kLibraryFolders64 = {"lib/x86_64-linux-gnu", "lib/aarch64-linux-gnu",
+                                          "lib/powerpc64le-linux-gnu", "lib/s390x-linux-gnu"};
+constexpr std::array kLibraryFolders32 = {"lib32", "lib/i386-linux-gnu"};
 
 fs::path inRoot(const fs::path& path) {
     return kBuildRoot / path.relative_path();
@@ -289,9 +295,13 @@ void enterWorld(const Host& host, const Helpers& helpers, const fs::path& record
 
     if (host.vendorLibrary) {
         writeFile(inRoot(kAdapterFilePath), adapterFile(*host.vendorLibrary, host.adapters));
-        bindFile(helpers.vendorLibrary64, own / "lib/x86_64-linux-gnu/libsimhba.so");
-        for (const char* folder : {"lib32", "lib/i386-linux-gnu"}) { // as multilib and i386 packages have it
-            bindFile(helpers.vendorLibrary32, own / folder / "libsimhba.so");
+        for (const char* folder : kLibraryFolders64) {
+            bindFile(helpers.vendorLibrary64, own / folder / "libsimhba.so");
+        }
+        if (fs::exists(helpers.vendorLibrary32)) {
+            for (const char* folder : kLibraryFolders32) {
+                bindFile(helpers.vendorLibrary32, own / folder / "libsimhba.so");
+            }
         }
     }
     if (!record.empty()) {
