@@ -97,15 +97,21 @@ cmd_test_dist() {
     tests/dist/build_again x86_64 build/dist
 }
 
+# build_for_processor PROCESSOR TARGET...: what ./dev dist builds for it, with tests.
+build_for_processor() {
+    need "${dist_packages[@]}" "${test_packages[@]}"
+    configure_dist "$1" -DMORVANE_TESTS=ON
+    cmake --build --preset "dist-$1" -- --quiet "${@:2}"
+}
+
 # The unit tests and morvane-view's reports, on processors that this machine has not: under qemu-user.
 cmd_test_processors() {
-    need "${dist_packages[@]}" "${test_packages[@]}" qemu-user
+    need qemu-user
     [ $# -gt 0 ] || set -- "${other_processors[@]}"
     local processor failed=()
     for processor in "$@"; do
         echo "== $processor"
-        configure_dist "$processor" -DMORVANE_TESTS=ON
-        cmake --build --preset "dist-$processor" -- --quiet all
+        build_for_processor "$processor" all
         ctest --preset "dist-$processor" || failed+=("$processor: unit tests")
         printf '#!/bin/sh\nexec qemu-%s -L "%s" "%s" "$@"\n' "$processor" "$PWD/build/sysroot/$processor" \
             "$PWD/build/dist-$processor/view/morvane-view" >"$scratch/morvane-view"

@@ -2,21 +2,34 @@
 # ./dev lab: Morvane in the laboratory's guest.
 
 lab_packages=(qemu-system-x86 cpio kmod python3)
+# Emulators of the other processors, and what a module for their kernels is built with.
+foreign_lab_packages=(qemu-system-arm qemu-system-misc dpkg-dev make binutils-aarch64-linux-gnu binutils-s390x-linux-gnu)
 
 cmd_lab() {
     need "${view_packages[@]}" "${lab_packages[@]}"
-    local task=() arches=(amd64 i386) arch preset failed=()
+    local task=() arches=(amd64 i386) arch folder view failed=()
     if [ "${1:-}" = shell ]; then
         task=(shell)
         arches=(amd64)
         shift
     fi
-    case ${1:-} in amd64 | i386) arches=("$1"); shift ;; esac
+    case ${1:-} in amd64 | i386 | arm64 | s390x) arches=("$1"); shift ;; esac
     for arch in "${arches[@]}"; do
-        preset=release
-        [ "$arch" = i386 ] && preset=i386
-        view=ON build "$preset" morvane morvane-view
-        as_root lab/run "$arch" "build/$preset/morvane" "build/$preset/view/morvane-view" "${task[@]}" "$@" || failed+=("$arch")
+        case $arch in
+            arm64 | s390x)
+                need "${foreign_lab_packages[@]}"
+                folder=build/dist-${arch/arm64/aarch64}
+                build_for_processor "${folder#*-}" morvane simulated_host_tests
+                view=ON build release morvane-view
+                view=build/release/view/morvane-view # the judge's
+                ;;
+            *)
+                folder=build/${arch/amd64/release}
+                view=ON build "${folder#*/}" morvane morvane-view
+                view=$folder/view/morvane-view
+                ;;
+        esac
+        as_root lab/run "$arch" "$folder/morvane" "$view" "${task[@]}" "$@" || failed+=("$arch")
     done
     [ ${#failed[@]} -eq 0 ] || { echo "laboratory failed: ${failed[*]}" >&2; return 1; }
 }

@@ -1,10 +1,24 @@
+#include <array>
+#include <cerrno>
 #include <charconv>
-#include <cstring>
+#include <string_view>
+#include <utility>
 
 #include "simhost/description_parts.hpp"
 
 namespace simhost {
 namespace {
+
+// What drivers and the kernel fail an ioctl with.
+constexpr std::array<std::pair<std::string_view, int>, 29> kErrors = {
+    {{"EPERM", EPERM},         {"ENOENT", ENOENT},     {"EINTR", EINTR},           {"EIO", EIO},
+     {"ENXIO", ENXIO},         {"EAGAIN", EAGAIN},     {"ENOMEM", ENOMEM},         {"EACCES", EACCES},
+     {"EFAULT", EFAULT},       {"EBUSY", EBUSY},       {"ENODEV", ENODEV},         {"EINVAL", EINVAL},
+     {"ENOTTY", ENOTTY},       {"ENOSPC", ENOSPC},     {"EROFS", EROFS},           {"ENOSYS", ENOSYS},
+     {"ENODATA", ENODATA},     {"EPROTO", EPROTO},     {"EBADMSG", EBADMSG},       {"EOVERFLOW", EOVERFLOW},
+     {"EILSEQ", EILSEQ},       {"EMSGSIZE", EMSGSIZE}, {"EOPNOTSUPP", EOPNOTSUPP}, {"ESHUTDOWN", ESHUTDOWN},
+     {"ETIMEDOUT", ETIMEDOUT}, {"ESTALE", ESTALE},     {"EREMOTEIO", EREMOTEIO},   {"ENOMEDIUM", ENOMEDIUM},
+     {"ECANCELED", ECANCELED}}};
 
 int commandOf(std::string_view text, const toml::node& node, const std::string& where) {
     if (text == "standard") {
@@ -26,8 +40,8 @@ int errorNumberOf(const toml::node& node, const std::string& where) {
         return static_cast<int>(*number);
     }
     if (const auto name = node.value_exact<std::string>()) {
-        for (int number = 1; number < 200; ++number) {
-            if (const char* known = strerrorname_np(number); known != nullptr && *name == known) {
+        for (const auto& [known, number] : kErrors) {
+            if (*name == known) {
                 return number;
             }
         }

@@ -156,7 +156,7 @@ int run(const Host& host, Arguments arguments) {
         const FileDescriptor initDescriptor(
             static_cast<int>(check(::syscall(SYS_pidfd_open, init, 0), "watching the host")));
         FileDescriptor listener(static_cast<int>(check(
-            ::syscall(SYS_pidfd_getfd, initDescriptor.get(), listenerNumber, 0), "taking the listener")));
+            ::syscall(__NR_pidfd_getfd, initDescriptor.get(), listenerNumber, 0), "taking the listener")));
         Supervisor supervisor(std::move(listener), init, host.disks, record);
         proceed.writing.reset();
         supervisor.run(initDescriptor.get());

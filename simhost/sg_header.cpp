@@ -2,8 +2,8 @@
 
 #include <sys/uio.h>
 
-#include <bit>
 #include <cstddef>
+#include <cstring>
 
 namespace simhost {
 namespace {
@@ -53,9 +53,16 @@ std::optional<SgRequest> readHeader(pid_t process, RemoteAddress address) {
 
 } // namespace
 
+void* pointerTo(RemoteAddress address) {
+    void* pointer = nullptr;
+    static_assert(sizeof pointer == sizeof address);
+    std::memcpy(&pointer, &address, sizeof pointer);
+    return pointer;
+}
+
 bool readMemory(pid_t process, RemoteAddress from, void* to, std::size_t size) {
     const iovec local{to, size};
-    const iovec remote{std::bit_cast<void*>(from), size};
+    const iovec remote{pointerTo(from), size};
     return process_vm_readv(process, &local, 1, &remote, 1, 0) == static_cast<ssize_t>(size);
 }
 

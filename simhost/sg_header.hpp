@@ -12,6 +12,9 @@ namespace simhost {
 // A pointer of the program under test.
 using RemoteAddress = std::uint64_t;
 
+// The address as process_vm_readv and process_vm_writev take it; nothing here is at it.
+void* pointerTo(RemoteAddress address);
+
 // What the program fills in, the fields that matter to a simulated disk.
 struct SgRequest {
     std::int32_t interfaceId = 0;

@@ -70,7 +70,7 @@ bool deliver(pid_t process, const SgRequest& request, ScsiReply& reply) {
             return;
         }
         local.at(parts) = {from, size};
-        remote.at(parts) = {std::bit_cast<void*>(to), size};
+        remote.at(parts) = {pointerTo(to), size};
         ++parts;
         total += static_cast<ssize_t>(size);
     };

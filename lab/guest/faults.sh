@@ -30,7 +30,7 @@ fc_disk() {
 stage_lun_offline() {
     local fc direct disk
     fc=$(fc_disk 0a 1)
-    direct=$(disk_by_serial LSI-0)
+    direct=$(disk_by_serial LSI-0 VIRTIO-4)
     fact lun-offline fc "/dev/$fc"
     fact lun-offline direct "/dev/$direct"
     for disk in "$fc" "$direct"; do echo offline >"/sys/block/$disk/device/state"; done

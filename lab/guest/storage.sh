@@ -39,13 +39,15 @@ direct_disks_up() {
     wait_for 20 "the disk of scsi_debug" test -e "/dev/$(scsi_debug_disk)"
 }
 
-# disk_by_serial SERIAL: the sdX whose unit serial number page holds the serial.
+# disk_by_serial SERIAL...: the sdX whose unit serial number page holds the first of the serials that is there.
 disk_by_serial() {
-    local device
-    for device in /sys/block/sd*; do
-        if grep -aq "$1" "$device/device/vpd_pg80" 2>/dev/null; then basename "$device"; return; fi
+    local serial device
+    for serial; do
+        for device in /sys/block/sd*; do
+            if grep -aq "$serial" "$device/device/vpd_pg80" 2>/dev/null; then basename "$device"; return; fi
+        done
     done
-    echo "lab: no disk has the serial number $1" >&2
+    echo "lab: no disk has the serial number $*" >&2
     return 1
 }
 
@@ -122,7 +124,7 @@ fc_paths() {
 
 fc_up() {
     local fabric lun store remote
-    modprobe -a e1000 fcoe
+    modprobe -a e1000 virtio_net fcoe
     for fabric in $fabrics; do
         lun=0
         for store in $fc_stores; do
@@ -209,7 +211,7 @@ storage_up() {
     passthrough naa "$(disk_by_serial VIRTIO-0)"
     passthrough plain "$(disk_by_serial VIRTIO-1)"
     passthrough emc "$(disk_by_serial 000190100123)"
-    passthrough ata "$(disk_by_serial PIIX-0)"
+    passthrough ata "$(disk_by_serial PIIX-0 AHCI-0 VIRTIO-3)"
     passthrough debug "$(scsi_debug_disk)"
     fc_up
     iscsi_up
