@@ -3,6 +3,7 @@
 
 # Each of them changes its root, which no process can whose root is the initramfs itself: a copy of the mount is theirs.
 stage_hosts() {
+    modprobe overlay
     cp -a /lab/hosts/. /
     mkdir -p /out/hosts /hosts-root
     mount --rbind / /hosts-root
