@@ -84,7 +84,8 @@ if(TARGET morvane-view)
   morvane_install(morvane-view ${CMAKE_INSTALL_BINDIR} view/morvane-view.1)
   install(FILES view/morvane-view.bash DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
     RENAME morvane-view COMPONENT morvane-view)
-  install(FILES view/morvane-log.schema.json DESTINATION ${CMAKE_INSTALL_DATADIR}/morvane-view COMPONENT morvane-view)
+  install(FILES view/morvane-log.schema.json view/morvane-verify.schema.json
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/morvane-view COMPONENT morvane-view)
   install(FILES docs/fleet.md docs/identity.md docs/view.png
     DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane-view COMPONENT morvane-view)
 

@@ -19,6 +19,7 @@
 #include "view/show/text.hpp"
 #include "view/show/warnings.hpp"
 #include "view/trouble.hpp"
+#include "view/verify_command.hpp"
 
 namespace {
 
@@ -34,6 +35,14 @@ void warnOf(const view::Model& model) {
 
 nlohmann::ordered_json named(const std::string& name, const view::Model& model) {
     return {{"name", name}, {"report", view::toJson(model)}};
+}
+
+// The document of a page that shows one report.
+nlohmann::ordered_json pageOf(const view::Model& model) {
+    const std::string host = model.host.empty() ? "an unnamed host" : view::printable(model.host);
+    nlohmann::ordered_json reports = nlohmann::ordered_json::array();
+    reports.push_back(named(host, model));
+    return {{"title", "Storage paths of " + host}, {"reports", std::move(reports)}, {"san", nullptr}};
 }
 
 view::Style outputStyle() {
@@ -53,11 +62,7 @@ struct Options {
 int report(const Options& options) {
     const view::Model model = view::openLog(options.log);
     if (!options.page.empty()) {
-        const std::string host = model.host.empty() ? "an unnamed host" : view::printable(model.host);
-        nlohmann::ordered_json reports = nlohmann::ordered_json::array();
-        reports.push_back(named(host, model));
-        const nlohmann::ordered_json document = {
-            {"title", "Storage paths of " + host}, {"reports", std::move(reports)}, {"san", nullptr}};
+        const nlohmann::ordered_json document = pageOf(model);
         view::writeOutput(options.page, {options.log},
                           [&](std::ostream& output) { view::writePage(output, document); });
     }
@@ -120,6 +125,23 @@ int san(const Options& options) {
     return status;
 }
 
+int verify(const Options& options, const view::VerifyRequest& request) {
+    const view::VerifyAnswer answer = view::answer(request);
+    if (!options.page.empty()) {
+        nlohmann::ordered_json document = pageOf(answer.model);
+        document["verify"] = view::toJson(answer.verification);
+        view::writeOutput(options.page, {answer.log},
+                          [&](std::ostream& output) { view::writePage(output, document); });
+    }
+    if (options.json) {
+        std::cout << view::toJson(answer.verification).dump(2) << '\n';
+    } else if (options.page.empty()) {
+        view::writeText(std::cout, answer.verification, outputStyle());
+    }
+    warnOf(answer.model);
+    return answer.verification.findings.empty() ? kExitSame : kExitDifferent;
+}
+
 constexpr const char* kExamples = R"(Examples:
   morvane-view                               read ./MorvaneLogs/Morvane.log
   ssh db1 cat MorvaneLogs/Morvane.log | morvane-view -
@@ -154,6 +176,25 @@ int run(int argc, char** argv) {
     sanCommand->add_flag("--json", options.json, "write JSON instead of text");
     sanCommand->add_option("--html", options.page, "write a page for the browser to FILE")->type_name("FILE");
 
+    view::VerifyRequest request;
+    CLI::App* verifyCommand = app.add_subcommand(
+        "verify", "compare a log with what the kernel and multipath remember of the devices");
+    verifyCommand->excludes(log);
+    verifyCommand->excludes(page);
+    verifyCommand->add_option("LOG", request.log, "the log of this host, - for standard input");
+    verifyCommand->add_option("--root", request.root, "look below DIR, a recording, instead of this host's /")
+        ->type_name("DIR");
+    verifyCommand
+        ->add_option("--maps", request.maps, "the states of paths, as multipathd show maps json printed them")
+        ->type_name("FILE");
+    verifyCommand
+        ->add_option("--record", request.record, "copy the files that are read and the log into a new folder")
+        ->type_name("DIR");
+    verifyCommand->add_flag("--force", request.isForced, "take a log of another host");
+    verifyCommand->add_flag("--json", options.json, "write JSON instead of text");
+    verifyCommand->add_option("--html", options.page, "write a page for the browser to FILE")
+        ->type_name("FILE");
+
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
@@ -164,6 +205,8 @@ int run(int argc, char** argv) {
         status = diff(options);
     } else if (*sanCommand) {
         status = san(options);
+    } else if (*verifyCommand) {
+        status = verify(options, request);
     } else {
         status = report(options);
     }

@@ -3,15 +3,16 @@
 _morvane_view() {
     local current=${COMP_WORDS[COMP_CWORD]} words=() word
     COMPREPLY=()
-    case ${COMP_WORDS[COMP_CWORD - 1]} in --html | =) return ;; esac # --html FILE and --html=FILE: files alone
+    case ${COMP_WORDS[COMP_CWORD - 1]} in --html | --maps | --record | --root | =) return ;; esac # their files alone
     if [[ $current == -* ]]; then
         case ${COMP_WORDS[1]} in
             diff) words=(--json --help) ;;
             san) words=(--json --html --help) ;;
+            verify) words=(--root --maps --record --force --json --html --help) ;;
             *) words=(--json --html --help --version) ;;
         esac
     elif [[ $COMP_CWORD -eq 1 ]]; then
-        words=(diff san)
+        words=(diff san verify)
     fi
     for word in "${words[@]}"; do
         [[ $word == "$current"* ]] && COMPREPLY+=("$word")

@@ -245,7 +245,8 @@ struct LogFacts {
 
 struct Model {
     LogFacts log;
-    std::string host; // empty when no tree names it
+    std::string host;                 // empty when no tree names it
+    std::optional<std::int64_t> time; // of the run, in seconds since the epoch, where its log tells
     Multipath multipath;
     FcTree fc;
     IscsiTree iscsi;

@@ -7,6 +7,11 @@ namespace view {
 void FcSection::take(const TextMatch& match) {
     const std::string_view first = match.fields[0];
     switch (match.text) {
+    case Text::TimeValues: // those of the library's loading stand first
+        if (!mDraft.model.time) {
+            mDraft.model.time = toNumber<std::int64_t>(first);
+        }
+        break;
     case Text::HbaLoadTime:
         mDraft.model.fc.loadMilliseconds = toMilliseconds(first);
         break;

@@ -83,7 +83,7 @@ constexpr auto kTable = std::to_array<KnownText>({
     {Text::LunLine, "|  |  |  |_ lun name %s luid %s oslun %u fcid %u fcplun 0%lx\n", Section::Fc},
 
     // FC tree.
-    {Text::Progress, "Time values: %.2f, %.2f, %.2f, %.2f\n"},
+    {Text::TimeValues, "Time values: %.2f, %.2f, %.2f, %.2f\n", Section::Fc},
     {Text::HbaLoadTime, "Time taken to load HBAAPI: %.2f milliseconds\n", Section::Fc},
     {Text::FcBuildTime, "Time taken to build tree: %.2f milliseconds\n", Section::Fc},
     {Text::Progress, "The system does not have any adapters\n"},

@@ -44,6 +44,7 @@ enum class Text : unsigned char {
     PowerPathTable,
     PowerPathEntry,
 
+    TimeValues,
     HbaLoadTime,
     HbaLoadFailed,
     FcBuildTime,

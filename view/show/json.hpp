@@ -5,6 +5,7 @@
 #include "view/model/diff.hpp"
 #include "view/model/model.hpp"
 #include "view/model/san.hpp"
+#include "view/model/verify.hpp"
 
 namespace view {
 
@@ -18,5 +19,8 @@ nlohmann::ordered_json toJson(const Difference& difference);
 
 // A document of kind "san", without the reports themselves.
 nlohmann::ordered_json toJson(const San& san);
+
+// The document that morvane-verify.schema.json describes.
+nlohmann::ordered_json toJson(const Verification& verification);
 
 } // namespace view

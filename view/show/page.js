@@ -267,6 +267,21 @@
   const hostCell = (host) => (many ? `<td>${esc(host.name)}</td>` : "");
   const hostHead = many ? ["Host"] : [];
 
+  // What differs between the devices and what the kernel and multipath remember of them, when that was asked.
+  function verifyHtml() {
+    if (!doc.verify) {
+      return "";
+    }
+    const found = doc.verify.findings;
+    const path = (p) => `<br>${finder(p.device)} <span class="faint">${p.lun === null ? "" : `LUN ${esc(p.lun)}`} ` +
+      `${p.target === null ? "" : `${esc(p.initiator)} → ${esc(p.target)}`}</span> ${p.name === null ? "" : `<code>${esc(p.name)}</code>`}`;
+    const item = (f) => `<div class="${f.severity === "danger" ? "problem" : "note"}"><b>${esc(f.meaning)}</b>` +
+      `${f.says ? `<br>${esc(f.says)}` : ""}${f.paths.map(path).join("")}<br><span class="faint">${esc(f.advice)}</span></div>`;
+    sections.push(["verify", `Compared with the kernel (${found.length})`]);
+    return `<h2 id="verify">Compared with the kernel (${found.length})</h2>` +
+      (found.map(item).join("") || "<p>Everything agrees.</p>");
+  }
+
   function problemsHtml() {
     const list = hosts.flatMap((host) => host.report.problems.map((problem) => ({ host, ...problem })));
     for (const lun of luns.values()) {
@@ -288,7 +303,7 @@
           log.leftoverTexts && `${log.leftoverTexts} texts of an older run left out`,
           log.unknown.count && `${plural(log.unknown.count, "piece")} not known, the first in line ${log.unknown.samples[0]?.line}: <code>${esc(log.unknown.samples[0]?.text)}</code>`]
           .filter(Boolean).join("; ") + "</div>");
-    return `<h2 id="problems-heading">Problems (${bad.length})</h2>` +
+    return verifyHtml() + `<h2 id="problems-heading">Problems (${bad.length})</h2>` +
       (bad.map(item).join("") || "<p>None.</p>") +
       (odd.length ? `<h2>The log itself</h2>${odd.join("")}` : "");
   }

@@ -5,6 +5,7 @@
 #include "view/model/diff.hpp"
 #include "view/model/model.hpp"
 #include "view/model/san.hpp"
+#include "view/model/verify.hpp"
 #include "view/show/text_layout.hpp"
 
 namespace view {
@@ -17,5 +18,8 @@ void writeText(std::ostream& output, const Difference& difference, const Style& 
 
 // Writes the hosts, then the identifiers that are not unique, then the LUNs by who sees them.
 void writeText(std::ostream& output, const San& san, const Style& style);
+
+// Writes the findings, the most dangerous first, then what was compared.
+void writeText(std::ostream& output, const Verification& verification, const Style& style);
 
 } // namespace view
