@@ -21,6 +21,7 @@ Host hostOf(const toml::table& document) {
         host.files.try_emplace("/etc/hba.conf", File{File::Kind::Content, std::string("org.simhost.hba ") +
                                                                               kVendorLibraryName + "\n"});
     }
+    host.memories = memoriesOf(keys, host);
     keys.refuseUnknown();
     return host;
 }

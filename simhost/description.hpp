@@ -117,6 +117,46 @@ struct VendorLibrary {
     std::uint32_t numberOfAdapters = 0;
 };
 
+// What the kernel remembers of a device node otherwise than the disk now answers.
+struct RememberedDisk {
+    std::string name;          // of the node as it is now: "sdc"; empty = the node's own
+    bool isMissing = false;    // the kernel has no such device
+    bool isScsi = true;        // the driver speaks SCSI, so that the kernel has asked who it is
+    bool hasPage = true;       // page 0x83 is kept; not before Linux 3.15
+    std::optional<Bytes> page; // in place of the disk's own
+    std::string wwid;          // empty = there is none
+    std::string state = "running";
+    std::string portState = "Online";   // of a Fibre Channel target port
+    std::optional<std::uint64_t> since; // seconds after the boot at which udev had it ready
+};
+
+// A multipath map.
+struct RememberedMap {
+    std::string name;
+    std::string uuid;
+    std::vector<std::string> paths; // device nodes
+};
+
+// An iSCSI session, as the folder in which the kernel keeps it.
+struct RememberedSession {
+    std::string name; // "session1"
+    std::string target;
+    std::string address;
+    std::string state;
+};
+
+// What the host's kernel, udev and multipath remember; what is not said is as the host is.
+struct Memory {
+    std::string name; // that tells it from others of the host
+    std::string hostName;
+    std::uint64_t bootTime = 0;                   // seconds since the epoch
+    std::map<std::string, RememberedDisk> disks;  // by device node
+    std::map<std::string, std::string> hostPorts; // port WWN by the host adapter's folder: "host2"
+    std::vector<RememberedSession> sessions;
+    std::vector<RememberedMap> maps;
+    std::optional<Bytes> listed; // what multipathd prints of them, as JSON
+};
+
 struct Host {
     std::string about;
     std::string hostName;
@@ -126,6 +166,7 @@ struct Host {
     std::vector<Disk> disks;
     std::optional<VendorLibrary> vendorLibrary; // none = no HBA configuration is made
     std::vector<Adapter> adapters;
+    std::vector<Memory> memories; // one at least
 };
 
 // The commands that a description may answer.

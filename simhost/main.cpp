@@ -19,6 +19,7 @@
 
 #include "simhost/description.hpp"
 #include "simhost/file_descriptor.hpp"
+#include "simhost/memory.hpp"
 #include "simhost/record.hpp"
 #include "simhost/supervisor.hpp"
 #include "simhost/world.hpp"
@@ -37,6 +38,7 @@ struct Arguments {
     fs::path description;
     fs::path record; // empty = none
     fs::path keep;   // empty = none
+    fs::path memory; // empty = none
     char** program = nullptr;
 };
 
@@ -54,15 +56,20 @@ int readArguments(int count, char** values, Arguments& arguments) {
         ->type_name("FILE");
     app.add_option("--keep", arguments.keep, "copy the files that are made for the host into DIR")
         ->type_name("DIR");
+    app.add_option(
+           "--memory", arguments.memory,
+           "write what the kernel and multipath remember into folders of DIR; no program is needed then")
+        ->type_name("DIR");
     try {
         app.parse(static_cast<int>(own - values), values);
-        if (end - own < 2) {
+        if (end - own < 2 && (own != end || arguments.memory.empty())) {
             throw CLI::RequiredError("-- PROGRAM");
         }
     } catch (const CLI::ParseError& error) {
+        arguments.memory.clear();
         return app.exit(error) == 0 ? 0 : kWrongUsage;
     }
-    arguments.program = own + 1;
+    arguments.program = own == end ? nullptr : own + 1;
     return 0;
 }
 
@@ -174,10 +181,14 @@ int main(int argumentCount, char** argumentValues) {
     try {
         simhost::Arguments arguments;
         const int status = simhost::readArguments(argumentCount, argumentValues, arguments);
-        if (arguments.program == nullptr) {
+        if (arguments.program == nullptr && arguments.memory.empty()) {
             return status;
         }
-        return simhost::run(simhost::readDescription(arguments.description), arguments);
+        const simhost::Host host = simhost::readDescription(arguments.description);
+        if (!arguments.memory.empty()) {
+            simhost::writeMemories(host, arguments.memory);
+        }
+        return arguments.program == nullptr ? 0 : simhost::run(host, arguments);
     } catch (const std::exception& error) {
         std::cerr << "simhost: " << error.what() << '\n';
         return simhost::kCannotSetUp;

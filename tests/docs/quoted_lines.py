@@ -11,6 +11,7 @@ fence or in a comment on the line before the display:
     log HOST nobody     likewise, of a run as an unprivileged user
     output HOST         the whole standard output
     view HOST           like log, of what morvane-view says of the log
+    verify HOST MEMORY  likewise of morvane-view verify, with a memory of the host
 
 Blanks at the ends of lines do not count.
 """
@@ -38,7 +39,7 @@ class Excerpt(NamedTuple):
 
 def markdown_excerpts(path: Path) -> Iterator[Excerpt]:
     text = path.read_text()
-    for match in re.finditer(r"^```(log|output|view) (\S+)(.*)\n((?:.*\n)*?)```$", text, re.MULTILINE):
+    for match in re.finditer(r"^```(log|output|view|verify) (\S+)(.*)\n((?:.*\n)*?)```$", text, re.MULTILINE):
         line = text.count("\n", 0, match.start()) + 1
         yield Excerpt(f"{path.name}:{line}", match[1], match[2], tuple(match[3].split()), match[4].splitlines())
 
@@ -51,7 +52,7 @@ def unescaped(line: str) -> str:
 
 def manual_excerpts(path: Path) -> Iterator[Excerpt]:
     text = path.read_text()
-    for match in re.finditer(r'^\.\\" (log|output|view) (\S+)(.*)\n\.Bd .*\n((?:.*\n)*?)\.Ed$', text, re.MULTILINE):
+    for match in re.finditer(r'^\.\\" (log|output|view|verify) (\S+)(.*)\n\.Bd .*\n((?:.*\n)*?)\.Ed$', text, re.MULTILINE):
         line = text.count("\n", 0, match.start()) + 1
         lines = [unescaped(quoted) for quoted in match[4].splitlines()]
         yield Excerpt(f"{path.name}:{line}", match[1], match[2], tuple(match[3].split()), lines)
@@ -69,6 +70,10 @@ def run(simhost: Path, morvane: Path, view: Path, host: str, as_nobody: bool) ->
         log = work / "MorvaneLogs" / "Morvane.log"
         report = subprocess.run([view, log], stdout=subprocess.PIPE, check=True).stdout
         texts = {"log": log.read_bytes(), "output": output, "view": report}
+        subprocess.run([simhost, HOSTS / host / "host.toml", "--memory", work / "memories"], check=True)
+        for root in (work / "memories").iterdir():
+            answer = subprocess.run([view, "verify", "--root", root, log], stdout=subprocess.PIPE, check=False)
+            texts[f"verify {root.name}"] = answer.stdout
     return {kind: text.decode(errors="replace").split("\n") for kind, text in texts.items()}
 
 
@@ -76,7 +81,8 @@ def complaint(excerpt: Excerpt, simhost: Path, morvane: Path, view: Path) -> str
     """What is wrong with an excerpt; empty when nothing is."""
     if not (HOSTS / excerpt.host / "host.toml").exists():
         return f"no simulated host {excerpt.host}"
-    text = run(simhost, morvane, view, excerpt.host, "nobody" in excerpt.options)[excerpt.kind]
+    kind = f"verify {excerpt.options[0]}" if excerpt.kind == "verify" else excerpt.kind
+    text = run(simhost, morvane, view, excerpt.host, "nobody" in excerpt.options)[kind]
     quoted = [line.rstrip() for line in excerpt.lines]
     if excerpt.kind == "output":
         actual = [line.rstrip() for line in text if line]
