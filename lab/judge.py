@@ -11,11 +11,13 @@ import json
 import re
 import subprocess
 import sys
+import tempfile
 from collections import Counter, defaultdict
 from pathlib import Path
 from statistics import median
 
 import devices
+import identity
 import morvane_log
 from morvane_log import Report
 from reference import PREFERENCE, Reference, expected_identifier, wwn
@@ -57,6 +59,7 @@ class Stage:
             path = place / file
             return path.read_bytes().decode("latin-1") if path.exists() else otherwise
 
+        self.place = place
         self.name = place.name
         self.lists_fc_ports = devices.MACHINES[place.parent.parent.name].lists_fc_ports
         self.log = left("Morvane.log")
@@ -327,6 +330,100 @@ def judge_fault(sheet: Sheet, stage: Stage) -> list[str]:
     return [f"  {stage.name:<24}{stage.seconds:6.1f} s  {lines[0]}", *(f"{'':36}{line}" for line in lines[1:])]
 
 
+# ---- identity: the devices, the kernel's memory of them, multipath's
+
+
+# Stage, and how many findings of each kind its fault must lead to.
+IDENTITY = {
+    "identity-healthy": {},
+    "stale-identity": {"stale-identity": 4, "map-name": 2},
+    "mixed-map": {"stale-identity": 2, "mixed-map": 2},
+    "path-missing": {"path-missing": 1},
+    "snapshot": {"shared-identity": 1},
+}
+
+
+def logged_names(stage: Stage, view: str) -> dict[str, dict]:
+    """The names that 'morvane-view --json' gives each device of the log that has a page 0x83 there."""
+    document = json.loads(subprocess.run([view, "--json", stage.place / "Morvane.log"], capture_output=True).stdout)
+    names = {device: lun["names"] for lun in document["luns"] for device in lun["devices"]}
+    names.update((disk["device"], disk["names"]) for disk in document["direct"]["devices"])
+    return {device: given for device, given in names.items() if given}
+
+
+def judge_names(sheet: Sheet, stage: Stage, view: str) -> None:
+    """Every name that follows from a page of the log is the one that the tool itself gives the disk."""
+    disks = identity.disks(stage.reference)
+    wwids = dict(line.split("|", 1) for line in stage.reference.text("multipath-paths").splitlines())
+    for device, given in sorted(logged_names(stage, view).items()):
+        disk = disks[device]
+        if given["scsiId"] is None and disk.asked.startswith("0"):
+            # The log of a direct disk is read without vendor and product, which are half of such a name.
+            print(f"            {device} has vendor specific designators alone, by which a direct disk gets no name: {disk.asked}")
+            continue
+        # What udev makes of the serial number's page and of ATA IDENTIFY, a log does not tell.
+        links = {link for link in disk.links if re.match("wwn-|scsi-[1-9]", link)}
+        # Of the LUNs that multipath looks at it takes udev's name, where ATA IDENTIFY gives none.
+        wwid = wwids.get(device.removeprefix("/dev/"), "")
+        compared = {
+            "scsi_id": (given["scsiId"], disk.asked),
+            "kernel": (given["kernel"] or "", disk.wwid),
+            "udev": (sorted(links & set(given["links"])), sorted(links)),
+        }
+        if wwid and f"ata-{wwid}" not in disk.links:
+            compared["multipath"] = (re.sub(r"\s+", "_", (given["multipath"] or given["scsiId"]).rstrip()), wwid)
+        sheet.row(f"{device}: named as by {', '.join(compared)}", all(ours == theirs for ours, theirs in compared.values()),
+                  disk.asked)
+        for tool, (ours, theirs) in compared.items():
+            if ours != theirs:
+                print(f"            {tool}: {ours!r} not {theirs!r}")
+
+
+def judge_verify(sheet: Sheet, stage: Stage, view: str) -> None:
+    """What verify said in the guest is what follows from the tools' answers, and so it is of the recording made there."""
+    expected = identity.expected_findings(stage.reference)
+    planted = Counter(IDENTITY[stage.name])
+    hit = {f"/dev/{disk}" for disk in stage.facts["disks"].split()}
+    maps = identity.maps(stage.reference)
+    sheet.row(
+        "by the tools: what was planted, on the disks that were hit",
+        Counter(finding.kind for finding in expected) == planted
+        and hit == {disk for finding in expected if finding.kind not in ("mixed-map", "map-name") for disk in finding.disks},
+        ", ".join(f"{count} {kind}" for kind, count in sorted(planted.items())) or "nothing",
+    )
+    with tempfile.TemporaryDirectory() as folder:
+        subprocess.run(["tar", "-xf", stage.place / "recording.tar", "-C", folder], check=True)
+        root = f"{folder}/recording"
+        there = subprocess.run([view, "verify", "--json", "--root", root], capture_output=True, text=True)
+    said = (stage.place / "verify.json").read_text()
+    status = int((stage.place / "verify.status").read_text())
+    sheet.row("verify: the same in the guest and of its recording", (said, status) == (there.stdout, there.returncode),
+              f"{len(said)} bytes, status {status}")
+    if status == 2:
+        sheet.row("verify: no trouble", False, (stage.place / "verify.stderr").read_text().strip())
+        return
+    document = json.loads(said)
+    found = identity.reported_findings(document)
+    sheet.same("verify: what differs by the tools, and nothing else", expected, set(found))
+    sheet.row("verify: nothing twice; status 0 if all agree, else 1",
+              len(found) == len(set(found)) and status == bool(expected))
+    compared = document["compared"]
+    known = [disk for disk in identity.disks(stage.reference).values() if disk.wwid]
+    sheet.row("verify: every disk that has a wwid was compared, and every map",
+              compared["byPage83"] + compared["byWwid"] >= len(known)
+              and compared["maps"] == compared["listedMaps"] == len(maps),
+              f"{compared['byPage83']} by page, {compared['byWwid']} by wwid, {compared['maps']} maps")
+
+
+def judge_identity(sheet: Sheet, stage: Stage, view: str) -> None:
+    sheet.title(f"Identity: {stage.name}")
+    sheet.row("the run ends", ran_to_its_end(stage), f"{stage.seconds:.1f} s")
+    judge_accounting(sheet, stage)
+    judge_verify(sheet, stage, view)
+    if not IDENTITY[stage.name]:
+        judge_names(sheet, stage, view)
+
+
 # ---- morvane-view, scale and word sizes
 
 
@@ -440,6 +537,9 @@ def main() -> int:
     if table:
         sheet.title("Faults and outcomes")
         print("\n".join(table))
+    for name in IDENTITY:
+        if (place / name).exists():
+            judge_identity(sheet, Stage(place / name), sys.argv[2])
     if (place / "scale").exists():
         judge_scale(sheet, place / "scale")
     if (place / "hosts").exists():

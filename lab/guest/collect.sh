@@ -48,7 +48,7 @@ inventory() {
     hostname >$out/hostname
     # In the order of the directory.
     find /sys/block -mindepth 1 | while read -r entry; do
-        echo "$(basename "$entry") $(readlink "$entry")"
+        echo "${entry##*/} $(readlink "$entry")"
     done >$out/sys-block
     cp /proc/partitions $out/proc-partitions
     directory_values /sys/class/fc_host/*/ >$out/fc-hosts

@@ -103,8 +103,7 @@ stage_iscsi_target_gone() {
 
 # A LUN that has no identifier, and no bytes in its INQUIRY data to make one of, appears on one fabric.
 stage_lun_without_identifier() {
-    local tpg=$target/fc/20:00:52:54:00:fa:0a:02/tpgt_1 acl disk
-    acl=$tpg/acls/20:00:52:54:00:fa:0a:01
+    local disk
     fc_export 0a 8 pscsi_0/plain
     echo "0 0 8" >"/sys/class/scsi_host/$(fc_host 0a)/scan"
     wait_for 20 "the new LUN" fc_paths 17
@@ -112,6 +111,5 @@ stage_lun_without_identifier() {
     fact lun-without-identifier fc "/dev/$disk"
     faulty_run lun-without-identifier
     echo 1 >"/sys/block/$disk/device/delete"
-    rm "$acl/lun_8/lun" "$tpg/lun/lun_8/store"
-    rmdir "$acl/lun_8" "$tpg/lun/lun_8"
+    fc_unexport 0a 8
 }

@@ -72,13 +72,14 @@ ramdisk() {
     echo 1 >"$store/enable"
 }
 
-# passthrough NAME sdX: a back store that hands every command to that disk of the guest.
+# passthrough NAME sdX: a back store that hands every command to that disk of the guest. LIO claims for itself the block
+# device that it is told of; told of a loop device that nothing uses, it leaves the disk free to be a path of a map.
 passthrough() {
     local store=$target/core/pscsi_0/$1 host channel id lun
     IFS=: read -r host channel id lun <<<"$(basename "$(readlink "/sys/block/$2/device")")"
     mkdir -p "$store"
     echo "scsi_host_id=$host,scsi_channel_id=$channel,scsi_target_id=$id,scsi_lun_id=$lun" >"$store/control"
-    echo "/dev/$2" >"$store/udev_path"
+    echo "/dev/loop$(find $target/core/pscsi_0 -mindepth 1 -maxdepth 1 -type d | wc -l)" >"$store/udev_path"
     echo 1 >"$store/enable"
 }
 
@@ -99,6 +100,14 @@ fc_export() {
     mkdir -p "$tpg/lun/lun_$2" "$tpg/acls/20:00:52:54:00:fa:$1:01/lun_$2"
     ln -s "$target/core/$3" "$tpg/lun/lun_$2/store"
     ln -s "$tpg/lun/lun_$2" "$tpg/acls/20:00:52:54:00:fa:$1:01/lun_$2/lun"
+}
+
+# fc_unexport FABRIC LUN: takes it away again; the initiator keeps its disk.
+fc_unexport() {
+    local tpg=$target/fc/20:00:52:54:00:fa:$1:02/tpgt_1
+    local acl=$tpg/acls/20:00:52:54:00:fa:$1:01
+    rm "$acl/lun_$2/lun" "$tpg/lun/lun_$2/store"
+    rmdir "$acl/lun_$2" "$tpg/lun/lun_$2"
 }
 
 # fc_port_up CARD: makes the card an FC port.
