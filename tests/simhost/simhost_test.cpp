@@ -568,6 +568,7 @@ Options:
   -h,--help                   Print this help message and exit
   --record FILE               write what the program asks of the host to FILE
   --keep DIR                  copy the files that are made for the host into DIR
+  --memory DIR                write what the kernel and multipath remember into folders of DIR; no program is needed then
 
 The program and its arguments follow behind --:
   simhost HOST.toml [OPTIONS] -- PROGRAM [ARGUMENT...]
