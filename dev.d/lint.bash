@@ -1,7 +1,7 @@
 # shellcheck shell=bash
 # ./dev lint and ./dev format: how sources, scripts and manual pages look.
 
-lint_packages=(clang-format clang-tidy shellcheck man-db groff-base)
+lint_packages=(clang-format clang-tidy shellcheck pyflakes3 man-db groff-base)
 
 # The C++ sources of the project, one a line.
 sources() {
@@ -18,6 +18,7 @@ cmd_lint() {
     shellcheck .ci/run tests/hardening/check.sh tests/packages/install_and_run view/morvane-view.bash
     shellcheck tests/dist/{build_again,check_program,install_rpms,run_in_clean_root}
     (cd lab/guest && shellcheck -x ../build-guest init course ./*.sh)
+    { git ls-files --cached --others --exclude-standard '*.py' && echo watch/morvane-watch; } | xargs pyflakes3
     lint_manual
     echo "lint: clean"
 }
@@ -25,7 +26,7 @@ cmd_lint() {
 # Whatever man has to say about a manual page is too much.
 lint_manual() {
     local page warnings
-    for page in docs/*.[1-8] view/*.[1-8]; do
+    for page in {docs,view,watch}/*.[1-8]; do
         warnings=$(LC_ALL=C.UTF-8 MANWIDTH=80 man --warnings --local-file "$page" 2>&1 >/dev/null)
         [ -z "$warnings" ] || { printf '%s\n' "$warnings" >&2; return 1; }
     done

@@ -87,7 +87,7 @@ def host(kind: str, reference: Reference, log: str, report: morvane_log.Report, 
         line for line in reference.text("proc-partitions").splitlines()
         if not line.startswith(" ") or kept(f"/dev/{line.split()[3]}")
     ]
-    text += "\n[files]\n" + f'"/proc/partitions" = """\n' + "\n".join(partitions) + '\n"""\n'
+    text += "\n[files]\n" + '"/proc/partitions" = """\n' + "\n".join(partitions) + '\n"""\n'
     if kind != "fc":
         initiator = reference.text("initiatorname.iscsi")
         text += f'"/etc/iscsi/initiatorname.iscsi" = {quoted(initiator)}\n'
