@@ -16,8 +16,7 @@ function(morvane_gzip SOURCE)
 endfunction()
 morvane_gzip(packaging/changelog)
 
-# Installs a program with what every package holds: its manual page and the copyright; for Debian the changelog, too, and
-# what lintian is to overlook.
+# Installs a program that is a target, with what every package holds.
 function(morvane_install PROGRAM FOLDER MANUAL)
   install(TARGETS ${PROGRAM} RUNTIME DESTINATION ${FOLDER} COMPONENT ${PROGRAM})
   # Stripping also takes the compilers' names, as Debian's packages do it.
@@ -25,6 +24,12 @@ function(morvane_install PROGRAM FOLDER MANUAL)
     execute_process(COMMAND ${CMAKE_STRIP} --remove-section=.comment
       \$ENV{DESTDIR}\${CMAKE_INSTALL_PREFIX}/${FOLDER}/${PROGRAM} COMMAND_ERROR_IS_FATAL ANY)
   endif()" COMPONENT ${PROGRAM})
+  morvane_install_documents(${PROGRAM} ${MANUAL})
+endfunction()
+
+# Installs what every package holds: the program's manual page and the copyright; for Debian the changelog, too, and what
+# lintian is to overlook, if anything.
+function(morvane_install_documents PROGRAM MANUAL)
   morvane_gzip(${MANUAL})
   cmake_path(GET MANUAL FILENAME page)
   string(REGEX MATCH "[1-8]$" section ${page})
@@ -36,8 +41,10 @@ function(morvane_install PROGRAM FOLDER MANUAL)
   endif()
   install(FILES packaging/copyright ${CMAKE_BINARY_DIR}/changelog.gz
     DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/${PROGRAM} COMPONENT ${PROGRAM})
-  install(FILES packaging/${PROGRAM}.lintian-overrides
-    DESTINATION ${CMAKE_INSTALL_DATADIR}/lintian/overrides RENAME ${PROGRAM} COMPONENT ${PROGRAM})
+  if(EXISTS ${CMAKE_SOURCE_DIR}/packaging/${PROGRAM}.lintian-overrides)
+    install(FILES packaging/${PROGRAM}.lintian-overrides
+      DESTINATION ${CMAKE_INSTALL_DATADIR}/lintian/overrides RENAME ${PROGRAM} COMPONENT ${PROGRAM})
+  endif()
 endfunction()
 
 if(MORVANE_PORTABLE)
@@ -63,14 +70,28 @@ set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
 morvane_install(morvane ${CMAKE_INSTALL_SBINDIR} docs/morvane.8)
 install(FILES README.md DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane COMPONENT morvane)
 file(GLOB documents CONFIGURE_DEPENDS docs/*.md docs/*.svg)
-list(REMOVE_ITEM documents ${CMAKE_SOURCE_DIR}/docs/fleet.md ${CMAKE_SOURCE_DIR}/docs/identity.md) # morvane-view's
+list(REMOVE_ITEM documents # other packages'
+  ${CMAKE_SOURCE_DIR}/docs/fleet.md ${CMAKE_SOURCE_DIR}/docs/identity.md ${CMAKE_SOURCE_DIR}/docs/watch.md)
 install(FILES ${documents} DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane/docs COMPONENT morvane)
+
+# Where the collectors of support bundles look for other programs' plugins. sos stands among the modules of the system's
+# Python: that of Debian, those of Enterprise Linux 8, 9 and 10.
+if(MORVANE_PORTABLE)
+  set(module_folders python3.6/site-packages python3.9/site-packages python3.12/site-packages)
+else()
+  set(module_folders python3/dist-packages)
+endif()
+foreach(folder ${module_folders})
+  install(FILES support/sos.py DESTINATION lib/${folder}/sos/report/plugins RENAME morvane.py COMPONENT morvane)
+endforeach()
+install(PROGRAMS support/supportconfig DESTINATION lib/supportconfig/plugins RENAME morvane COMPONENT morvane)
 
 set(CPACK_COMPONENTS_ALL morvane)
 set(CPACK_DEBIAN_MORVANE_PACKAGE_NAME morvane)
 set(CPACK_DEBIAN_MORVANE_PACKAGE_SECTION admin)
 set(CPACK_DEBIAN_MORVANE_PACKAGE_RECOMMENDS procps) # pgrep, for the look at PowerPath's daemon
-set(CPACK_DEBIAN_MORVANE_PACKAGE_SUGGESTS "morvane-view, open-iscsi")
+set(CPACK_DEBIAN_MORVANE_PACKAGE_SUGGESTS "morvane-view, morvane-watch, open-iscsi")
+set(CPACK_DEBIAN_MORVANE_PACKAGE_CONTROL_EXTRA ${CMAKE_SOURCE_DIR}/packaging/debian/morvane/prerm)
 set(CPACK_COMPONENT_MORVANE_DESCRIPTION
 "Storage-path report for Linux hosts
 Morvane finds every storage path of a Linux host: Fibre Channel LUNs through
@@ -103,6 +124,40 @@ what differs between two logs of a host, and joins the logs of many hosts into
 one view of the SAN.
 .
 It needs no storage, no root and no Morvane on the machine that reads.")
+endif()
+
+if(TARGET morvane-view)
+  install(PROGRAMS watch/morvane-watch DESTINATION ${CMAKE_INSTALL_SBINDIR} COMPONENT morvane-watch)
+  install(DIRECTORY watch/morvane_watch DESTINATION ${CMAKE_INSTALL_DATADIR}/morvane-watch COMPONENT morvane-watch
+    FILES_MATCHING PATTERN *.py PATTERN __pycache__ EXCLUDE)
+  morvane_install_documents(morvane-watch watch/morvane-watch.8)
+  install(FILES docs/watch.md DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane-watch COMPONENT morvane-watch)
+  install(FILES watch/morvane-watch.bash DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
+    RENAME morvane-watch COMPONENT morvane-watch)
+  install(FILES watch/watch.conf DESTINATION /etc/morvane COMPONENT morvane-watch)
+  install(FILES watch/morvane-watch.service watch/morvane-watch.timer DESTINATION lib/systemd/system
+    COMPONENT morvane-watch)
+
+  list(APPEND CPACK_COMPONENTS_ALL morvane-watch)
+  set(CPACK_DEBIAN_MORVANE-WATCH_PACKAGE_NAME morvane-watch)
+  set(CPACK_DEBIAN_MORVANE-WATCH_PACKAGE_SOURCE morvane)
+  set(CPACK_DEBIAN_MORVANE-WATCH_PACKAGE_SECTION admin)
+  set(CPACK_DEBIAN_MORVANE-WATCH_PACKAGE_ARCHITECTURE all)
+  set(CPACK_DEBIAN_MORVANE-WATCH_PACKAGE_DEPENDS
+    "python3:any, morvane, morvane-view (>= ${PROJECT_VERSION}), zstd, init-system-helpers (>= 1.54~)")
+  set(CPACK_DEBIAN_MORVANE-WATCH_PACKAGE_CONTROL_EXTRA "")
+  foreach(file conffiles postinst prerm postrm)
+    list(APPEND CPACK_DEBIAN_MORVANE-WATCH_PACKAGE_CONTROL_EXTRA
+      ${CMAKE_SOURCE_DIR}/packaging/debian/morvane-watch/${file})
+  endforeach()
+  set(CPACK_COMPONENT_MORVANE-WATCH_DESCRIPTION
+"Watch over the storage paths of a Linux host
+morvane-watch runs Morvane every night, keeps the logs, and compares each with
+the state that somebody accepted. A lost path or LUN, or another LUN behind a
+path, goes to the journal and makes a systemd unit fail, so that the monitoring
+that is there sees it.
+.
+It starts nothing by itself: enable morvane-watch.timer.")
 endif()
 include(cmake/Rpm.cmake)
 include(CPack)

@@ -50,6 +50,7 @@ tarball() {
         cmake --install "build/dist-$1" --component "$program" --strip --prefix "$folder" >/dev/null
         tests/dist/check_program "$folder"/*bin/"$program"
     done
+    rm -r "$folder/lib" # plugins, for folders that an archive does not reach
     cp packaging/tarball/README "$folder"
     tar --create --directory "$scratch" --format=ustar --sort=name --owner=0 --group=0 --numeric-owner \
         --mode=u=rwX,go=rX --mtime="@$SOURCE_DATE_EPOCH" "$(basename "$folder")" | xz -9 >"build/dist/$(basename "$folder").tar.xz"
