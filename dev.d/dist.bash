@@ -3,7 +3,7 @@
 # build/dist.
 
 dist_packages=(cmake ninja-build clang llvm xz-utils rpm rpmlint)
-test_dist_packages=(mmdebstrap arch-test diffoscope-minimal)
+test_dist_packages=(mmdebstrap arch-test busybox-static diffoscope-minimal)
 other_processors=(aarch64 ppc64le s390x)
 other_processor_packages=(binutils-aarch64-linux-gnu binutils-powerpc64le-linux-gnu binutils-s390x-linux-gnu)
 
@@ -50,7 +50,7 @@ tarball() {
         cmake --install "build/dist-$1" --component "$program" --strip --prefix "$folder" >/dev/null
         tests/dist/check_program "$folder"/*bin/"$program"
     done
-    rm -r "$folder/lib" # plugins, for folders that an archive does not reach
+    rm -r "${folder:?}/lib" # plugins, for folders that an archive does not reach
     cp packaging/tarball/README "$folder"
     tar --create --directory "$scratch" --format=ustar --sort=name --owner=0 --group=0 --numeric-owner \
         --mode=u=rwX,go=rX --mtime="@$SOURCE_DATE_EPOCH" "$(basename "$folder")" | xz -9 >"build/dist/$(basename "$folder").tar.xz"
@@ -90,7 +90,7 @@ cmd_test_dist() {
     local processor release
     for processor in x86_64 i686; do
         as_root tests/dist/install_rpms build/dist/morvane-[0-9]*."$processor".rpm build/dist/morvane-view-*."$processor".rpm \
-            "build/sysroot/$processor"
+            build/dist/morvane-watch-*.noarch.rpm "build/sysroot/$processor"
         for release in bullseye bookworm trixie; do
             as_root tests/dist/run_in_clean_root "$release" build/dist/*-linux-"$processor".tar.xz build/release
         done

@@ -16,9 +16,11 @@ cmd_lint() {
     sources | grep '\.cpp$' | xargs -P "$(nproc)" -n 4 clang-tidy --quiet -p build/debug 2>/dev/null
     shellcheck -x -a dev # with all it sources
     shellcheck .ci/run tests/hardening/check.sh tests/packages/install_and_run view/morvane-view.bash
+    shellcheck watch/morvane-watch.bash support/supportconfig packaging/debian/*/p* packaging/rpm/*/p*
+    shellcheck tests/watch/guest/{build,course}
     shellcheck tests/dist/{build_again,check_program,install_rpms,run_in_clean_root}
     (cd lab/guest && shellcheck -x ../build-guest init course ./*.sh)
-    { git ls-files --cached --others --exclude-standard '*.py' && echo watch/morvane-watch; } | xargs pyflakes3
+    { git ls-files --cached --others --exclude-standard '*.py' && echo watch/morvane-watch tests/watch/guest/run; } | xargs pyflakes3
     lint_manual
     echo "lint: clean"
 }

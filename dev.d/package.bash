@@ -1,8 +1,9 @@
 # shellcheck shell=bash
-# ./dev package and ./dev test-packages: the Debian packages for both architectures.
+# ./dev package, ./dev test-packages and ./dev test-watch: the Debian packages for both architectures.
 
 package_packages=(dpkg-dev lintian)
 clean_root_packages=(mmdebstrap arch-test jq)
+watch_guest_packages=(mmdebstrap e2fsprogs qemu-system-x86)
 
 # dependencies PRESET PROGRAM: the Depends field for a program in the preset's build folder: the packages, and
 # their versions, that hold the libraries and the symbols it uses.
@@ -48,6 +49,14 @@ cmd_test_packages() {
     need "${clean_root_packages[@]}"
     local arch
     for arch in amd64 i386; do
-        as_root tests/packages/install_and_run build/packages/morvane{,-view}_*_"$arch".deb
+        as_root tests/packages/install_and_run build/packages/morvane{,-view}_*_"$arch".deb build/packages/morvane-watch_*_all.deb
     done
+}
+
+# morvane-watch and the support bundles where systemd is the init: in a guest, with nights by a clock that is turned.
+cmd_test_watch() {
+    cmd_package
+    need "${watch_guest_packages[@]}"
+    as_root tests/watch/guest/build build/watch-guest
+    as_root tests/watch/guest/run build/watch-guest build/packages/morvane{,-view}_*_amd64.deb build/packages/morvane-watch_*_all.deb
 }
