@@ -1,9 +1,10 @@
 """The plugin by which `sos report` takes Morvane's log along."""
 
-from sos.report.plugins import Plugin, IndependentPlugin
+from sos.report.plugins import Plugin, RedHatPlugin, DebianPlugin, UbuntuPlugin, SuSEPlugin
 
 
-class Morvane(Plugin, IndependentPlugin):
+# Each distribution by its name: Debian's sos passes over plugins that are independent of it.
+class Morvane(Plugin, RedHatPlugin, DebianPlugin, UbuntuPlugin, SuSEPlugin):
 
     short_desc = 'Storage paths, as Morvane reports them'
     plugin_name = 'morvane'

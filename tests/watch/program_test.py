@@ -239,6 +239,17 @@ class Runs(WatchTest):
                          ["20151121T020000Z", "20151121T020000Z_1", "20151121T020000Z_2"])
         self.assertEqual(State(self.state).last()["name"], "20151121T020000Z_2")
 
+    def test_a_name_that_is_taken_is_left_to_its_owner(self):
+        self.morvane(HEALTHY)
+        self.history.mkdir(parents=True)
+        (self.history / "20151121T020000Z.log.zst").symlink_to("elsewhere")
+        (self.history / "20151121T020000Z_1.log.zst").mkdir()
+        (self.history / "20151121T020000Z_2.incomplete.log.zst").touch()
+        self.watch_at(NIGHT, "run")
+        self.assertEqual(self.names(), ["20151121T020000Z.log.zst", "20151121T020000Z_1.log.zst",
+                                        "20151121T020000Z_2.incomplete.log.zst", "20151121T020000Z_3.log.zst"])
+        self.assertEqual(State(self.state).last()["name"], "20151121T020000Z_3")
+
     def test_a_log_that_does_not_fit_into_the_history_is_kept_where_it_is_and_no_run_writes_over_it(self):
         self.morvane(HEALTHY)
         self.watch("run")
@@ -465,7 +476,7 @@ class Settings(WatchTest):
 
     def test_that_cannot_be_read_are_told(self):
         self.assertEqual(settings.read(str(self.folder)).troubles, [f"{self.folder}: Is a directory"])
-        self.assertEqual(settings.read("/dev/zero").troubles, ["/dev/zero: is longer than 65536 bytes"])
+        self.assertEqual(settings.read("/dev/zero").troubles, ["/dev/zero: is longer than 4096 bytes"])
 
 
 class Journal(WatchTest):

@@ -151,7 +151,7 @@ class State:
             with open(log, "rb") as source, open(new, "wb") as archive:
                 compress(source, archive)
                 os.fsync(archive.fileno())
-            taken = {archive.name for archive in self.archives()}
+            taken = {file.split(".")[0] for file in os.listdir(self.history)}
             second = time.strftime(TIME, time.gmtime(began))
             name = next(name for name in names_of(second) if name not in taken)
             file = name + ("" if is_whole else ".incomplete") + ".log.zst"
@@ -167,8 +167,8 @@ class State:
 
     def retire(self, keep, weeks, now, spared):
         """Removes logs from the history but for the newest `keep`, the first whole one of each of the last `weeks`
-        weeks, this one included, and the archives in spared. Logs from after now do not count and stay. Gives the texts of what went
-        wrong."""
+        weeks, this one included, and the archives in spared. Logs from after now do not count and stay. Gives the texts
+        of what went wrong."""
         archives = [archive for archive in self.archives() if archive.time <= now]
         kept = {archive.name for archive in archives[-keep:] + spared}
         first = {}

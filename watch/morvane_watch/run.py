@@ -13,6 +13,7 @@ from .trouble import Trouble, printable, told
 
 MOST_REPORTED = 1000  # differences told one by one
 MOST_SAID_BYTES = 4096  # of Morvane's standard error
+MOST_REMEMBERED = 20  # troubles
 
 # Exit statuses.
 SAME, DIFFERENT, IN_TROUBLE, NO_BASELINE = 0, 1, 2, 3
@@ -41,7 +42,7 @@ class Run:
                 self.state.remember({
                     "name": self.archive and self.archive.name,
                     "began": time.strftime(TIME, time.gmtime(self.began)),
-                    "trouble": "; ".join(self.troubles) or None,
+                    "trouble": "; ".join(self.troubles[:MOST_REMEMBERED]) or None,
                 })
         return IN_TROUBLE if self.troubles else self.status
 

@@ -4,7 +4,7 @@ import re
 
 from .trouble import printable, told
 
-MOST_BYTES = 1 << 16
+MOST_BYTES = 4096
 
 # Each setting with its default, the least and the most it may be.
 KNOWN = {
