@@ -5,6 +5,7 @@
 #include <fstream>
 #include <map>
 #include <system_error>
+#include <utility>
 
 namespace simhost {
 namespace {
@@ -69,8 +70,8 @@ Bytes pageOf(const Disk& disk) {
 
 class Writer {
 public:
-    Writer(const Host& host, const Memory& memory, const fs::path& root)
-        : mHost(host), mMemory(memory), mRoot(root) {
+    Writer(const Host& host, const Memory& memory, fs::path root)
+        : mHost(host), mMemory(memory), mRoot(std::move(root)) {
         for (const Adapter& adapter : host.adapters) {
             for (const MappedLun& lun : adapter.luns) {
                 mLuns.try_emplace(lun.device, &lun);

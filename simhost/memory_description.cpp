@@ -17,7 +17,7 @@ void refuseUnlessNode(const Host& host, const std::string& node, const toml::nod
 
 // A name stands for one file or folder.
 std::string plainName(Keys& keys, std::string_view key) {
-    const std::string name = keys.string(key).value_or("");
+    std::string name = keys.string(key).value_or("");
     if (name == "." || name == ".." || name.find('/') != std::string::npos) {
         throw DescriptionError(keys.where() + "." + std::string(key) + ": no name of a file: \"" + name +
                                "\"");

@@ -97,12 +97,14 @@ private:
                wholeNumber(entry.substr(4, controller - 4)).has_value();
     }
 
+    // The block devices that a folder of one has links to; nothing else there is one.
     std::vector<std::string> linked(const std::string& block, const std::string& name) {
         std::vector<std::string> names;
         if (const auto folder = mTree.folder(block, name)) {
-            names = mTree.list(*folder);
-            for (const std::string& linked : names) {
-                mTree.folder(*folder, linked); // so that a recording has it
+            for (const std::string& entry : mTree.list(*folder)) {
+                if (mTree.folder(*folder, entry)) {
+                    names.push_back(entry);
+                }
             }
         }
         return names;
