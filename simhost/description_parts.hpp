@@ -33,7 +33,8 @@ std::vector<Adapter> adaptersOf(Keys& host);
 // described.
 std::optional<VendorLibrary> vendorLibraryOf(Keys& host, std::size_t adapters);
 
-// What the kernel and multipath may remember of `described`, from `memory`; when nothing is said, all as it is.
+// What the kernel and multipath may remember of `described`, from `memory`; when nothing is said, all as it
+// is.
 std::vector<Memory> memoriesOf(Keys& host, const Host& described);
 
 } // namespace simhost

@@ -57,7 +57,8 @@ Model openLog(const std::string& path) {
     } catch (const NotALog&) {
         // as one that was read to its end
     } catch (const UnpacksTooFar&) {
-        throw troubleWith(path, "unpacks to thousands of times its size, which no log does; it is not read further");
+        throw troubleWith(
+            path, "unpacks to thousands of times its size, which no log does; it is not read further");
     }
     throw troubleWith(path, "is not a Morvane log");
 }

@@ -11,7 +11,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8* data, std::size_t size) {
     std::istringstream stream{std::string(input.rest())};
     try {
         const view::Model model = view::readLog(stream, "log");
-        require(model.log.knownBytes + model.log.unknownBytes == model.log.bytes, "bytes neither known nor unknown");
+        require(model.log.knownBytes + model.log.unknownBytes == model.log.bytes,
+                "bytes neither known nor unknown");
         require(model.log.damage.empty() || !model.log.complete, "a damaged log that is whole");
     } catch (const view::NotALog&) {
         return 0;

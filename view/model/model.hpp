@@ -239,8 +239,8 @@ struct LogFacts {
     unsigned runs = 0;                        // that begin in the log; the last one is reported
     bool beginsInside = false;                // the log does not begin with the beginning of a run
     bool cutInLine = false;                   // the last line has no end
-    bool complete = false;                    // the closing banner was reached, and nothing is missing behind it
-    std::string damage; // why the packed file that holds it could not be unpacked to its end
+    bool complete = false; // the closing banner was reached, and nothing is missing behind it
+    std::string damage;    // why the packed file that holds it could not be unpacked to its end
 };
 
 struct Model {

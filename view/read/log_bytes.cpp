@@ -1,9 +1,9 @@
 #include "view/read/log_bytes.hpp"
 
+#include <archive.h>
+
 #include <new>
 #include <vector>
-
-#include <archive.h>
 
 namespace view {
 

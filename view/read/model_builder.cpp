@@ -110,11 +110,10 @@ Model ModelBuilder::finish(LogFacts facts) {
     }
     if (!facts.damage.empty()) {
         draft.model.problems.insert( // the first: what was unpacked last may be damaged, too
-            draft.model.problems.begin(),
-            {Severity::Problem, ProblemKind::LogCut, Tree::Run, "log",
-             "the compressed file is cut off or damaged (" + facts.damage +
-                 "): the report holds what could be unpacked",
-             draft.line});
+            draft.model.problems.begin(), {Severity::Problem, ProblemKind::LogCut, Tree::Run, "log",
+                                           "the compressed file is cut off or damaged (" + facts.damage +
+                                               "): the report holds what could be unpacked",
+                                           draft.line});
     }
     if (mRun->misplacedTexts > 0) {
         draft.model.problems.push_back(
