@@ -199,7 +199,7 @@ std::string HostTree::line(const std::string& folder, const std::string& name) {
     return text;
 }
 
-std::vector<std::string> HostTree::list(const std::string& folder) {
+std::vector<std::string> HostTree::list(const std::string& folder) const {
     const int number =
         openat(mRoot, folder.empty() ? "." : folder.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
     const std::unique_ptr<DIR, int (*)(DIR*)> directory(number < 0 ? nullptr : fdopendir(number), closedir);

@@ -61,7 +61,7 @@ public:
 
     // The names in a folder, shorter ones first, so that sdz stands before sdaa. Throws std::runtime_error
     // when there are more than a host can have.
-    std::vector<std::string> list(const std::string& folder);
+    std::vector<std::string> list(const std::string& folder) const;
 
     static constexpr std::size_t kUsualLimit = 4096; // of an attribute in sysfs: a page of memory
 
