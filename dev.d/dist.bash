@@ -91,10 +91,12 @@ cmd_test_dist() {
     for processor in x86_64 i686; do
         as_root tests/dist/install_rpms build/dist/morvane-[0-9]*."$processor".rpm build/dist/morvane-view-*."$processor".rpm \
             build/dist/morvane-watch-*.noarch.rpm "build/sysroot/$processor"
-        for release in bullseye bookworm trixie; do
-            as_root tests/dist/run_in_clean_root "$release" build/dist/*-linux-"$processor".tar.xz build/release
-        done
     done
+    for release in bullseye bookworm trixie; do
+        for processor in x86_64 i686; do
+            echo "$release" build/dist/*-linux-"$processor".tar.xz build/release
+        done
+    done | at_once tests/dist/run_in_clean_root
     tests/dist/build_again x86_64 build/dist
 }
 

@@ -7,7 +7,7 @@ foreign_lab_packages=(qemu-system-arm qemu-system-misc dpkg-dev make binutils-aa
 
 cmd_lab() {
     need "${view_packages[@]}" "${lab_packages[@]}"
-    local task=() arches=(amd64 i386) arch folder view failed=()
+    local task=() arches=(amd64 i386) arch folder view guest guests=()
     if [ "${1:-}" = shell ]; then
         task=(shell)
         arches=(amd64)
@@ -29,7 +29,13 @@ cmd_lab() {
                 view=$folder/view/morvane-view
                 ;;
         esac
-        as_root lab/run "$arch" "$folder/morvane" "$view" "${task[@]}" "$@" || failed+=("$arch")
+        guest=("$arch" "$folder/morvane" "$view" "${task[@]}" "$@")
+        guests+=("${guest[*]}")
     done
-    [ ${#failed[@]} -eq 0 ] || { echo "laboratory failed: ${failed[*]}" >&2; return 1; }
+    if [ "${task[*]}" = shell ]; then
+        # shellcheck disable=SC2086 # the words of a line
+        as_root lab/run ${guests[0]}
+    else
+        printf '%s\n' "${guests[@]}" | at_once lab/run
+    fi
 }
