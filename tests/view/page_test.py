@@ -1,6 +1,8 @@
 #!/usr/bin/python3
-"""Opens the pages of morvane-view in headless Chromium. usage: page_test.py MORVANE-VIEW [unittest arguments]"""
+"""Opens the pages of morvane-view in headless Chromium.
+usage: page_test.py MORVANE-VIEW SIMHOST [unittest arguments]"""
 
+import json
 import sys
 import tempfile
 import unittest
@@ -10,7 +12,9 @@ from selenium import webdriver
 from selenium.webdriver.chrome.service import Service
 
 import make_log
-from support import host_log, hosts, lab_log, lab_stages, report, run
+from support import host_log, hosts, lab_log, lab_stages, memories, report, run
+
+SIMHOST = Path(sys.argv[2]).resolve()
 
 
 def listed(document):
@@ -40,9 +44,9 @@ class Page(unittest.TestCase):
         cls.folder = tempfile.TemporaryDirectory()
         cls.addClassCleanup(cls.folder.cleanup)
 
-    def open(self, log):
+    def open(self, log, *command, status=0):
         page = Path(self.folder.name, "page.html")
-        self.assertEqual(run("--html", page, "-", log=log).returncode, 0)
+        self.assertEqual(run(*command, "--html", page, "-", log=log).returncode, status)
         self.browser.get(page.as_uri())
         self.assertEqual(self.browser.get_log("browser"), [])
         return report(log)
@@ -100,6 +104,31 @@ class Page(unittest.TestCase):
                 "return document.querySelector('#luns tbody tr:not([hidden])').textContent"))
         self.assertEqual(self.browser.get_log("browser"), [])
 
+    def test_what_differs_from_the_kernels_memory_stands_above_the_problems_with_its_paths(self):
+        log = host_log("remembered")
+        for name, root in memories(SIMHOST, "remembered", Path(self.folder.name, "memories")).items():
+            with self.subTest(name):
+                compared = json.loads(run("verify", "--json", "--root", root, "-", log=log).stdout)
+                findings = compared["findings"]
+                self.check_picture(self.open(log, "verify", "--root", root, status=1 if findings else 0))
+                shown = self.browser.execute_script(
+                    "const shown = [];"
+                    "for (let e = document.getElementById('verify').nextElementSibling; e.tagName !== 'H2';"
+                    "     e = e.nextElementSibling) {"
+                    "  shown.push({ meaning: e.querySelector('b')?.textContent ?? e.textContent,"
+                    "               devices: [...e.querySelectorAll('button')].map((b) => b.textContent) });"
+                    "} return shown")
+                self.assertEqual(shown, [{"meaning": finding["meaning"], "devices": [path["device"] for path in finding["paths"]]}
+                                         for finding in findings] or [{"meaning": "Everything agrees.", "devices": []}])
+                if name == "devices-differ":  # the log has no path of the first
+                    continue
+                for button in self.browser.find_elements("css selector", "#verify + div button")[:1]:
+                    button.click()
+                    self.assertIn(button.text, self.browser.find_element("id", "paths").text)
+                    self.assertIn(button.text, self.browser.execute_script(
+                        "return [...document.querySelectorAll('#paths tr.hit')].map((row) => row.cells[0].textContent)"))
+        self.assertEqual(self.browser.get_log("browser"), [])
+
     def test_paper_shows_the_whole_picture_and_nothing_to_type_into(self):
         self.open(make_log.big(10000).bytes())
         self.browser.execute_cdp_cmd("Emulation.setEmulatedMedia", {"media": "print"})
@@ -126,4 +155,4 @@ class Page(unittest.TestCase):
 
 
 if __name__ == "__main__":
-    unittest.main(argv=[sys.argv[0], *sys.argv[2:]])
+    unittest.main(argv=[sys.argv[0], *sys.argv[3:]])

@@ -34,6 +34,13 @@ def host_log(host):
     return log
 
 
+def memories(simhost, host, folder):
+    """What the kernel of a simulated host may remember, laid out in the folder: the roots by their names."""
+    done = subprocess.run([simhost, HOSTS / host / "host.toml", "--memory", folder], capture_output=True, check=False)
+    assert (done.returncode, done.stderr) == (0, b""), (host, done)
+    return {root.name: root for root in sorted(Path(folder).iterdir())}
+
+
 def lab_stages():
     return sorted(path.name.removesuffix(".log.xz") for path in LAB.glob("*.log.xz"))
 

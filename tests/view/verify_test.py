@@ -9,7 +9,6 @@ import difflib
 import json
 import os
 import shutil
-import subprocess
 import sys
 import tempfile
 import time
@@ -18,7 +17,7 @@ from pathlib import Path
 
 import jsonschema
 
-from support import HERE, HOSTS, ROOT, host_log, hosts, run
+from support import HERE, ROOT, host_log, hosts, memories, run
 
 SIMHOST = Path(sys.argv[2]).resolve()
 GOLDEN = HERE / "verify"
@@ -55,10 +54,7 @@ class Scratch(unittest.TestCase):
 
     def memories(self, host):
         """The memories of a simulated host by their names, as roots."""
-        folder = self.folder / "memories" / host
-        done = subprocess.run([SIMHOST, HOSTS / host / "host.toml", "--memory", folder], capture_output=True, check=False)
-        self.assertEqual((done.returncode, done.stderr), (0, b""), host)
-        return {root.name: root for root in sorted(folder.iterdir())}
+        return memories(SIMHOST, host, self.folder / "memories" / host)
 
     def verify(self, log, *arguments, status):
         done = run("verify", *arguments, "-", log=log, folder=self.folder)
@@ -92,11 +88,11 @@ class Memories(Scratch):
 
     def test_each_memory_gives_the_findings_that_it_is_there_for_and_no_others(self):
         log = host_log("remembered")
-        memories = self.memories("remembered")
-        self.assertEqual(sorted(memories), sorted(FINDINGS))
+        roots = self.memories("remembered")
+        self.assertEqual(sorted(roots), sorted(FINDINGS))
         for memory, expected in FINDINGS.items():
             with self.subTest(memory):
-                document = json.loads(self.verify(log, "--json", "--root", memories[memory], status=1 if expected else 0))
+                document = json.loads(self.verify(log, "--json", "--root", roots[memory], status=1 if expected else 0))
                 found = [(finding["kind"], " ".join(path["device"].removeprefix("/dev/") for path in finding["paths"]))
                          for finding in document["findings"]]
                 self.assertEqual(found, expected)
