@@ -283,6 +283,7 @@
   }
 
   function problemsHtml() {
+    const compared = verifyHtml();
     const list = hosts.flatMap((host) => host.report.problems.map((problem) => ({ host, ...problem })));
     for (const lun of luns.values()) {
       for (const reason of doc.san ? lun.doubt : []) {
@@ -303,7 +304,7 @@
           log.leftoverTexts && `${log.leftoverTexts} texts of an older run left out`,
           log.unknown.count && `${plural(log.unknown.count, "piece")} not known, the first in line ${log.unknown.samples[0]?.line}: <code>${esc(log.unknown.samples[0]?.text)}</code>`]
           .filter(Boolean).join("; ") + "</div>");
-    return verifyHtml() + `<h2 id="problems-heading">Problems (${bad.length})</h2>` +
+    return compared + `<h2 id="problems-heading">Problems (${bad.length})</h2>` +
       (bad.map(item).join("") || "<p>None.</p>") +
       (odd.length ? `<h2>The log itself</h2>${odd.join("")}` : "");
   }
