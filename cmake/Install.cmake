@@ -103,8 +103,18 @@ It takes no arguments and changes nothing on the host but its log directory.")
 
 if(TARGET morvane-view)
   morvane_install(morvane-view ${CMAKE_INSTALL_BINDIR} view/morvane-view.1)
-  install(FILES view/morvane-view.bash DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
-    RENAME morvane-view COMPONENT morvane-view)
+  # Where each shell of the distribution looks for other packages' completions.
+  if(MORVANE_PORTABLE)
+    set(zsh_folder zsh/site-functions)
+  else()
+    set(zsh_folder zsh/vendor-completions)
+  endif()
+  install(FILES ${CMAKE_BINARY_DIR}/view/completion.bash RENAME morvane-view
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions COMPONENT morvane-view)
+  install(FILES ${CMAKE_BINARY_DIR}/view/completion.zsh RENAME _morvane-view
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/${zsh_folder} COMPONENT morvane-view)
+  install(FILES ${CMAKE_BINARY_DIR}/view/completion.fish RENAME morvane-view.fish
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d COMPONENT morvane-view)
   install(FILES view/morvane-log.schema.json view/morvane-verify.schema.json
     DESTINATION ${CMAKE_INSTALL_DATADIR}/morvane-view COMPONENT morvane-view)
   install(FILES docs/fleet.md docs/identity.md docs/view.png

@@ -12,7 +12,8 @@ set(CPACK_RPM_CHANGELOG_FILE ${CMAKE_SOURCE_DIR}/packaging/rpm/changelog)
 # What other packages own.
 set(CPACK_RPM_EXCLUDE_FROM_AUTO_FILELIST_ADDITION
   /etc /usr/lib /usr/lib/systemd /usr/lib/systemd/system /usr/sbin /usr/share/man /usr/share/man/man1 /usr/share/man/man8
-  /usr/share/bash-completion /usr/share/bash-completion/completions /usr/share/licenses)
+  /usr/share/bash-completion /usr/share/bash-completion/completions /usr/share/zsh /usr/share/zsh/site-functions
+  /usr/share/fish /usr/share/fish/vendor_completions.d /usr/share/licenses)
 
 # A component's description begins with its summary, and has Debian's mark between its paragraphs.
 foreach(component ${CPACK_COMPONENTS_ALL})

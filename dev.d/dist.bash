@@ -2,10 +2,10 @@
 # ./dev dist, ./dev test-dist and ./dev test-processors: the programs for every server, as tarballs and RPMs, in
 # build/dist.
 
-dist_packages=(cmake ninja-build clang llvm xz-utils rpm rpmlint)
+dist_packages=(cmake ninja-build clang llvm xz-utils rpm rpmlint libc6-i386) # the last runs what was built for i686
 test_dist_packages=(mmdebstrap arch-test busybox-static diffoscope-minimal)
 other_processors=(aarch64 ppc64le s390x)
-other_processor_packages=(binutils-aarch64-linux-gnu binutils-powerpc64le-linux-gnu binutils-s390x-linux-gnu)
+other_processor_packages=(qemu-user binutils-aarch64-linux-gnu binutils-powerpc64le-linux-gnu binutils-s390x-linux-gnu)
 
 # The mirror of Debian's archive that this host installs from.
 debian_mirror() {
@@ -71,7 +71,7 @@ cmd_dist() {
     esac
     for processor in "$@"; do
         configure_dist "$processor"
-        cmake --build --preset "dist-$processor" -- --quiet morvane morvane-view compressed_documents
+        cmake --build --preset "dist-$processor" -- --quiet morvane morvane-view completions compressed_documents
         version=$(sed -n 's/^CMAKE_PROJECT_VERSION:STATIC=//p' "build/dist-$processor/CMakeCache.txt")
         tarball "$processor" "$version"
         cpack --config "build/dist-$processor/CPackConfig.cmake" -B build/dist >"$scratch/cpack" 2>&1 ||

@@ -16,7 +16,7 @@ cmd_lint() {
     sources | xargs clang-format --dry-run --Werror
     sources | grep '\.cpp$' | xargs -P "$(nproc)" -n 4 clang-tidy --quiet -p build/lint 2>/dev/null
     shellcheck -x -a dev # with all it sources
-    shellcheck .ci/run tests/hardening/check.sh tests/packages/install_and_run view/morvane-view.bash
+    shellcheck .ci/run tests/hardening/check.sh tests/packages/install_and_run
     shellcheck watch/morvane-watch.bash support/supportconfig packaging/debian/*/p* packaging/rpm/*/p*
     shellcheck tests/watch/guest/{build,course}
     shellcheck tests/dist/{build_again,check_program,install_rpms,run_in_clean_root}

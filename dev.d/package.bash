@@ -31,7 +31,7 @@ cmd_package() {
     rm -rf build/packages
     local preset depends view_depends
     for preset in release i386; do
-        view=ON build "$preset" morvane morvane-view compressed_documents
+        view=ON build "$preset" morvane morvane-view completions compressed_documents
         depends=$(dependencies "$preset" morvane)
         view_depends=$(dependencies "$preset" view/morvane-view)
         cpack --config "build/$preset/CPackConfig.cmake" -B build/packages \

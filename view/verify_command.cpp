@@ -1,21 +1,28 @@
-#include "view/verify_command.hpp"
-
 #include <sys/stat.h>
 
 #include <cerrno>
 #include <filesystem>
 #include <fstream>
 #include <iostream>
-#include <iterator>
+#include <memory>
 #include <optional>
 #include <stdexcept>
+#include <string>
 #include <vector>
 
+#include "view/command_output.hpp"
+#include "view/commands.hpp"
 #include "view/input_log.hpp"
 #include "view/kernel/block_devices.hpp"
 #include "view/kernel/host_tree.hpp"
+#include "view/kernel/kernel.hpp"
 #include "view/kernel/multipathd.hpp"
+#include "view/model/verify.hpp"
+#include "view/output_file.hpp"
 #include "view/show/escape.hpp"
+#include "view/show/html_page.hpp"
+#include "view/show/json.hpp"
+#include "view/show/text.hpp"
 #include "view/trouble.hpp"
 
 namespace view {
@@ -23,6 +30,22 @@ namespace view {
 namespace {
 
 namespace fs = std::filesystem;
+
+// What morvane-view verify is asked.
+struct Request {
+    std::string log;       // empty: where Morvane writes it, or where a recording has it
+    std::string root;      // of a host's files; empty: this host's
+    std::string maps;      // a file with multipathd's list; empty: none, or a recording's
+    std::string record;    // a new folder that the files are copied into; empty: none
+    bool isForced = false; // whether a log of another host is taken
+};
+
+// What was read, and what came of it.
+struct Answer {
+    std::string log; // the file
+    Model model;
+    Verification verification;
+};
 
 constexpr const char* kLogs = "MorvaneLogs"; // on a host, Morvane's own folder; so named in a recording, too
 constexpr const char* kLog = "Morvane.log";
@@ -40,7 +63,7 @@ std::string recorded(const std::string& root, const char* name) {
                : std::string();
 }
 
-std::string logOf(const VerifyRequest& request) {
+std::string logOf(const Request& request) {
     if (!request.log.empty()) {
         return request.log;
     }
@@ -87,7 +110,7 @@ std::optional<std::int64_t> timeOf(const std::string& log) {
     return facts.st_mtime;
 }
 
-void refuseOtherHost(const VerifyRequest& request, const Model& model, const std::string& host) {
+void refuseOtherHost(const Request& request, const Model& model, const std::string& host) {
     if (!request.isForced && !model.host.empty() && !host.empty() && model.host != host) {
         throw Trouble("the log is of host " + printable(model.host) + ", but " +
                       (request.root.empty() ? "this host is " : printable(request.root) + " is of host ") +
@@ -103,8 +126,8 @@ void copyInto(Recording& recording, const std::string& file, const char* name) {
     fs::last_write_time(place, fs::last_write_time(file));
 }
 
-VerifyAnswer compared(const VerifyRequest& request) {
-    VerifyAnswer answer;
+Answer compared(const Request& request) {
+    Answer answer;
     answer.log = logOf(request);
     answer.model = openLog(answer.log);
     if (!answer.model.time) {
@@ -147,9 +170,9 @@ VerifyAnswer compared(const VerifyRequest& request) {
     return answer;
 }
 
-} // namespace
-
-VerifyAnswer answer(const VerifyRequest& request) {
+// Reads the log and what the host, or a recording of one, remembers, and compares them. Throws Trouble when
+// one of them cannot be read, makes no sense or is of another host.
+Answer answerTo(const Request& request) {
     try {
         return compared(request);
     } catch (const Trouble&) {
@@ -157,6 +180,46 @@ VerifyAnswer answer(const VerifyRequest& request) {
     } catch (const std::runtime_error& error) { // the system's, with the name of a file in it
         throw Trouble(printable(error.what()));
     }
+}
+
+int run(const CommandLine& line, const Request& request) {
+    const Answer answer = answerTo(request);
+    if (!line.page.empty()) {
+        nlohmann::ordered_json document = pageOf(answer.model);
+        document["verify"] = toJson(answer.verification);
+        writeOutput(line.page, {answer.log}, [&](std::ostream& output) { writePage(output, document); });
+    }
+    if (line.json) {
+        std::cout << toJson(answer.verification).dump(2) << '\n';
+    } else if (line.page.empty()) {
+        writeText(std::cout, answer.verification, outputStyle());
+    }
+    warnOf(answer.model);
+    return answer.verification.findings.empty() ? kExitSame : kExitDifferent;
+}
+
+} // namespace
+
+void addVerify(CommandLine& line) {
+    const auto request = std::make_shared<Request>();
+    CLI::App* command =
+        line.addCommand("verify", "compare a log with what the kernel and multipath remember of the devices",
+                        [&line, request] { return run(line, *request); });
+    command->excludes(line.pageOption);
+    command->add_option("LOG", request->log, "the log of this host, - for standard input")->type_name("FILE");
+    command->add_option("--root", request->root, "look below DIR, a recording, instead of this host's /")
+        ->type_name("DIR");
+    command
+        ->add_option("--maps", request->maps,
+                     "the states of paths, as multipathd show maps json printed them")
+        ->type_name("FILE");
+    command
+        ->add_option("--record", request->record,
+                     "copy the files that are read and the log into a new folder")
+        ->type_name("DIR");
+    command->add_flag("--force", request->isForced, "take a log of another host");
+    line.addJson(command);
+    line.addPage(command);
 }
 
 } // namespace view

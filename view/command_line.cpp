@@ -1,0 +1,67 @@
+#include "view/command_line.hpp"
+
+#include <iostream>
+
+#include "view/commands.hpp"
+#include "view/trouble.hpp"
+
+namespace view {
+
+namespace {
+
+constexpr const char* kExamples = R"(Examples:
+  morvane-view                               read ./MorvaneLogs/Morvane.log
+  ssh db1 cat MorvaneLogs/Morvane.log | morvane-view -
+  morvane-view --html paths.html Morvane.log
+  morvane-view --json Morvane.log | jq '.luns[] | select(.pathCount < 2)'
+  morvane-view diff before.log after.log     exit status 0 same, 1 different, 2 trouble
+  morvane-view san --html san.html logs/*/Morvane.log)";
+
+} // namespace
+
+CommandLine::CommandLine()
+    : app("Reads the logs of morvane: the storage paths of a host, what is wrong with them, what changed.",
+          "morvane-view") {
+    app.footer(kExamples);
+    app.set_version_flag("--version", MORVANE_VERSION);
+    logOption = app.add_option("LOG", log, "the log to read, - for standard input")->type_name("FILE");
+    logOption->capture_default_str();
+    addJson(&app);
+    pageOption = app.add_option("--html", page, "write a page for the browser to FILE")->type_name("FILE");
+    addDiff(*this);
+    addSan(*this);
+    addVerify(*this);
+    addCompletion(*this);
+}
+
+CLI::App* CommandLine::addCommand(const std::string& name, const std::string& description, Run run) {
+    CLI::App* command = app.add_subcommand(name, description);
+    command->excludes(logOption);
+    commands.emplace_back(command, std::move(run));
+    return command;
+}
+
+void CommandLine::addJson(CLI::App* command) {
+    command->add_flag("--json", json, "write JSON instead of text");
+}
+
+void CommandLine::addPage(CLI::App* command) {
+    command->add_option("--html", page, "write a page for the browser to FILE")->type_name("FILE");
+}
+
+int runCommandLine(int argc, char** argv) {
+    CommandLine line;
+    try {
+        line.app.parse(argc, argv);
+    } catch (const CLI::ParseError& error) {
+        return line.app.exit(error) == 0 ? kExitSame : kExitTrouble;
+    }
+    for (const auto& [command, run] : line.commands) {
+        if (*command) {
+            return run();
+        }
+    }
+    return runReport(line);
+}
+
+} // namespace view
