@@ -14,6 +14,7 @@ constexpr const char* kExamples = R"(Examples:
   ssh db1 cat MorvaneLogs/Morvane.log | morvane-view -
   morvane-view --html paths.html Morvane.log
   morvane-view --json Morvane.log | jq '.luns[] | select(.pathCount < 2)'
+  morvane-view paths -o device,luid,map --filter 'problem=*unique*'
   morvane-view diff before.log after.log     exit status 0 same, 1 different, 2 trouble
   morvane-view san --html san.html logs/*/Morvane.log)";
 
@@ -26,8 +27,9 @@ CommandLine::CommandLine()
     app.set_version_flag("--version", MORVANE_VERSION);
     logOption = app.add_option("LOG", log, "the log to read, - for standard input")->type_name("FILE");
     logOption->capture_default_str();
-    addJson(&app);
-    pageOption = app.add_option("--html", page, "write a page for the browser to FILE")->type_name("FILE");
+    jsonOption = addJson(&app);
+    pageOption = addPage(&app);
+    addPaths(*this);
     addDiff(*this);
     addSan(*this);
     addVerify(*this);
@@ -41,12 +43,12 @@ CLI::App* CommandLine::addCommand(const std::string& name, const std::string& de
     return command;
 }
 
-void CommandLine::addJson(CLI::App* command) {
-    command->add_flag("--json", json, "write JSON instead of text");
+CLI::Option* CommandLine::addJson(CLI::App* command) {
+    return command->add_flag("--json", json, "write JSON instead of text");
 }
 
-void CommandLine::addPage(CLI::App* command) {
-    command->add_option("--html", page, "write a page for the browser to FILE")->type_name("FILE");
+CLI::Option* CommandLine::addPage(CLI::App* command) {
+    return command->add_option("--html", page, "write a page for the browser to FILE")->type_name("FILE");
 }
 
 int runCommandLine(int argc, char** argv) {

@@ -24,15 +24,16 @@ struct CommandLine {
 
     CommandLine();
 
-    // Adds a command that needs neither the program's own LOG nor its --html, which are refused beside it.
+    // Adds a command. The program's own LOG is refused beside it.
     CLI::App* addCommand(const std::string& name, const std::string& description, Run run);
 
     // Adds --json and --html FILE; what they are given before the command's name counts as well.
-    void addJson(CLI::App* command);
-    void addPage(CLI::App* command);
+    CLI::Option* addJson(CLI::App* command);
+    CLI::Option* addPage(CLI::App* command);
 
     CLI::App app;
     CLI::Option* logOption = nullptr;  // the program's own LOG
+    CLI::Option* jsonOption = nullptr; // the program's own --json
     CLI::Option* pageOption = nullptr; // the program's own --html
     std::string log = "./MorvaneLogs/Morvane.log";
     bool json = false;

@@ -10,6 +10,7 @@ namespace view {
 int runReport(const CommandLine& line);
 
 void addDiff(CommandLine& line);
+void addPaths(CommandLine& line);
 void addSan(CommandLine& line);
 void addVerify(CommandLine& line);
 void addCompletion(CommandLine& line);

@@ -29,6 +29,7 @@ void addCompletion(CommandLine& line) {
         line.addCommand("completion", "print what makes a shell complete this program's arguments",
                         [&line, shell] { return run(line, *shell); });
     command->excludes(line.pageOption);
+    command->excludes(line.jsonOption);
     const std::vector<std::string> shells = {"bash", "zsh", "fish"};
     CLI::Option* option = command->add_option("SHELL", *shell, "bash, zsh or fish")->required();
     option->check(CLI::IsMember(shells))->type_name("");

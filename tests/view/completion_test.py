@@ -112,6 +112,17 @@ class Completion(unittest.TestCase):
                 self.assertEqual(self.typed(shell, "completion z\t"), ["completion", "zsh"])
         self.assertEqual(self.listed("morvane-view completion "), ["bash", "fish", "zsh"])
 
+    def test_columns_one_behind_the_other(self):
+        for shell in SHELLS:
+            with self.subTest(shell=shell):
+                self.assertEqual(self.typed(shell, "paths -o dev\t,lui\t be\t"),
+                                 ["paths", "-o", "device,luid", "before maintenance.log"])
+                self.assertEqual(self.typed(shell, "paths --columns=dev\t"), ["paths", "--columns=device"])
+        self.assertEqual(self.listed("morvane-view paths --columns dev"), ["device\tthe columns, with commas between"])
+        self.assertEqual(self.listed("morvane-view paths -o device,ad"),
+                         ["device,adapter\tthe columns, with commas between",
+                          "device,address\tthe columns, with commas between"])
+
 
 if __name__ == "__main__":
     unittest.main(argv=sys.argv[:1] + sys.argv[2:])
