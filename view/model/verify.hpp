@@ -40,13 +40,40 @@ struct PathOfLun {
     std::string lun;
 };
 
+// A particular of a finding.
+struct Detail {
+    enum class Kind : unsigned char {
+        // Of StaleIdentity.
+        SameKernelName, // other designators differ
+        // Of SharedIdentity: why several LUNs are behind the name.
+        SeveralLunNumbers, // at one target
+        OtherDesignators,
+        OtherProduct,
+        // Of PathState: who says that the path is in the state.
+        DiskState,
+        PortState,
+        SessionState,
+        ControllerState,
+        ListedDeviceState, // this and the following: multipathd
+        ListedMapState,
+        CheckerState,
+        // Of MapsDiffer: who knows the map, or a device in it, alone.
+        MapNotListed,
+        MapListedAlone,
+        PathListedAlone,
+        PathNotListed,
+    };
+    Kind kind = Kind::SameKernelName;
+    std::string device; // the controller of ControllerState, the device of PathListedAlone and PathNotListed
+    std::string state;  // of the kinds of PathState
+};
+
 struct Finding {
     FindingKind kind = FindingKind::StaleIdentity;
     std::vector<PathOfLun> paths; // that it is about; none where it is about a map or the log alone
     std::string map;              // that holds them or should, by its name; empty when none does
     std::string remembered;       // of StaleIdentity and MapName: the name that the kernel or the map has
-    std::vector<std::string>
-        details;             // in words: of PathState the states, of MapsDiffer and SharedIdentity why
+    std::vector<Detail> details;
     bool isOfOldLog = false; // of StaleIdentity: the log is older than the kernel's memory
 };
 

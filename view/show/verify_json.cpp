@@ -30,13 +30,17 @@ Json findingJson(const Finding& finding) {
     for (const PathOfLun& path : finding.paths) {
         paths.push_back(pathJson(path));
     }
+    Json details = Json::array();
+    for (const Detail& detail : finding.details) {
+        details.push_back(printable(words(detail)));
+    }
     return {{"severity", isDanger(finding.kind) ? "danger" : "warning"},
             {"kind", name(finding.kind)},
             {"meaning", meaning(finding.kind)},
             {"paths", paths},
             {"map", textOrNull(finding.map)},
             {"remembered", textOrNull(finding.remembered)},
-            {"details", texts(finding.details)},
+            {"details", details},
             {"says", particulars(finding)},
             {"advice", advice(finding)}};
 }

@@ -92,9 +92,45 @@ std::string_view meaning(NotCompared reason) {
     return pick(kReasonWords, reason).meaning;
 }
 
+std::string words(const Detail& detail) {
+    using Kind = Detail::Kind;
+    switch (detail.kind) {
+    case Kind::SameKernelName:
+        return "the kernel's name for both is the same; other designators differ";
+    case Kind::SeveralLunNumbers:
+        return "one target shows it at several LUN numbers";
+    case Kind::OtherDesignators:
+        return "their other designators differ";
+    case Kind::OtherProduct:
+        return "they are of different products";
+    case Kind::DiskState:
+        return "the kernel's device is " + detail.state;
+    case Kind::PortState:
+        return "its target port is " + detail.state;
+    case Kind::SessionState:
+        return "its session is " + detail.state;
+    case Kind::ControllerState:
+        return "its controller " + detail.device + " is " + detail.state;
+    case Kind::ListedDeviceState:
+        return "multipathd's device state is " + detail.state;
+    case Kind::ListedMapState:
+        return "multipathd's map state is " + detail.state;
+    case Kind::CheckerState:
+        return "multipathd's checker says " + detail.state;
+    case Kind::MapNotListed:
+        return "the kernel has it, multipathd's list lacks it";
+    case Kind::MapListedAlone:
+        return "multipathd lists it, the kernel lacks it";
+    case Kind::PathListedAlone:
+        return "multipathd lists " + detail.device + " in it, the kernel does not";
+    default:
+        return "the kernel has " + detail.device + " in it, multipathd's list does not";
+    }
+}
+
 std::string particulars(const Finding& finding) {
-    std::string words;
-    const auto add = [&](const std::string& part) { words += (words.empty() ? "" : "; ") + part; };
+    std::string text;
+    const auto add = [&](const std::string& part) { text += (text.empty() ? "" : "; ") + part; };
     if (!finding.map.empty()) {
         add("map " + printable(finding.map));
     }
@@ -108,10 +144,10 @@ std::string particulars(const Finding& finding) {
     } else if (finding.kind == FindingKind::MapName) {
         add("it was made for " + printable(finding.remembered));
     }
-    for (const std::string& detail : finding.details) {
-        add(printable(detail));
+    for (const Detail& detail : finding.details) {
+        add(printable(words(detail)));
     }
-    return words;
+    return text;
 }
 
 std::string timeWords(std::int64_t time) {

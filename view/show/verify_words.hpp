@@ -19,6 +19,9 @@ std::string_view advice(const Finding& finding);
 // Why devices could not be compared.
 std::string_view meaning(NotCompared reason);
 
+// A particular of a finding, with the bytes of names and states as they are.
+std::string words(const Detail& detail);
+
 // What a finding says beyond its paths and its kind, fit to be shown; empty for nothing.
 std::string particulars(const Finding& finding);
 
