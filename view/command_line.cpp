@@ -27,8 +27,10 @@ CommandLine::CommandLine()
     app.set_version_flag("--version", MORVANE_VERSION);
     logOption = app.add_option("LOG", log, "the log to read, - for standard input")->type_name("FILE");
     logOption->capture_default_str();
-    jsonOption = addJson(&app);
-    pageOption = addPage(&app);
+    addJson(&app);
+    addPage(&app);
+    jsonOption = app.get_option("--json");
+    pageOption = app.get_option("--html");
     addPaths(*this);
     addDiff(*this);
     addSan(*this);
@@ -43,12 +45,12 @@ CLI::App* CommandLine::addCommand(const std::string& name, const std::string& de
     return command;
 }
 
-CLI::Option* CommandLine::addJson(CLI::App* command) {
-    return command->add_flag("--json", json, "write JSON instead of text");
+void CommandLine::addJson(CLI::App* command) {
+    command->add_flag("--json", json, "write JSON instead of text");
 }
 
-CLI::Option* CommandLine::addPage(CLI::App* command) {
-    return command->add_option("--html", page, "write a page for the browser to FILE")->type_name("FILE");
+void CommandLine::addPage(CLI::App* command) {
+    command->add_option("--html", page, "write a page for the browser to FILE")->type_name("FILE");
 }
 
 int runCommandLine(int argc, char** argv) {

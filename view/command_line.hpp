@@ -28,8 +28,8 @@ struct CommandLine {
     CLI::App* addCommand(const std::string& name, const std::string& description, Run run);
 
     // Adds --json and --html FILE; what they are given before the command's name counts as well.
-    CLI::Option* addJson(CLI::App* command);
-    CLI::Option* addPage(CLI::App* command);
+    void addJson(CLI::App* command);
+    void addPage(CLI::App* command);
 
     CLI::App app;
     CLI::Option* logOption = nullptr;  // the program's own LOG
