@@ -3,6 +3,7 @@
 #include <iostream>
 
 #include "view/commands.hpp"
+#include "view/show/escape.hpp"
 #include "view/trouble.hpp"
 
 namespace view {
@@ -15,6 +16,7 @@ constexpr const char* kExamples = R"(Examples:
   morvane-view --html paths.html Morvane.log
   morvane-view --json Morvane.log | jq '.luns[] | select(.pathCount < 2)'
   morvane-view diff before.log after.log     exit status 0 same, 1 different, 2 trouble
+  morvane-view check accepted.log            for Nagios, Icinga, Checkmk: one line, status 0 to 3
   morvane-view san --html san.html logs/*/Morvane.log)";
 
 } // namespace
@@ -28,6 +30,7 @@ CommandLine::CommandLine()
     logOption->capture_default_str();
     addJson(&app);
     pageOption = app.add_option("--html", page, "write a page for the browser to FILE")->type_name("FILE");
+    addCheck(*this);
     addDiff(*this);
     addSan(*this);
     addVerify(*this);
@@ -54,6 +57,9 @@ int runCommandLine(int argc, char** argv) {
     try {
         line.app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
+        if (error.get_exit_code() != 0 && line.app.got_subcommand("check")) {
+            return endUnknown(printable(error.what()));
+        }
         return line.app.exit(error) == 0 ? kExitSame : kExitTrouble;
     }
     for (const auto& [command, run] : line.commands) {
