@@ -30,6 +30,9 @@ CommandLine::CommandLine()
     logOption->capture_default_str();
     addJson(&app);
     pageOption = app.add_option("--html", page, "write a page for the browser to FILE")->type_name("FILE");
+    metricsOption = app.add_option("--prometheus", metrics,
+                                   "write metrics to FILE, for the textfile collector of node_exporter");
+    metricsOption->type_name("FILE");
     addCheck(*this);
     addDiff(*this);
     addSan(*this);
@@ -40,6 +43,7 @@ CommandLine::CommandLine()
 CLI::App* CommandLine::addCommand(const std::string& name, const std::string& description, Run run) {
     CLI::App* command = app.add_subcommand(name, description);
     command->excludes(logOption);
+    command->excludes(metricsOption);
     commands.emplace_back(command, std::move(run));
     return command;
 }

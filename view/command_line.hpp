@@ -24,7 +24,8 @@ struct CommandLine {
 
     CommandLine();
 
-    // Adds a command that needs neither the program's own LOG nor its --html, which are refused beside it.
+    // Adds a command that needs neither the program's own LOG nor its --prometheus, which are refused beside
+    // it.
     CLI::App* addCommand(const std::string& name, const std::string& description, Run run);
 
     // Adds --json and --html FILE; what they are given before the command's name counts as well.
@@ -34,9 +35,11 @@ struct CommandLine {
     CLI::App app;
     CLI::Option* logOption = nullptr;  // the program's own LOG
     CLI::Option* pageOption = nullptr; // the program's own --html
+    CLI::Option* metricsOption = nullptr;
     std::string log = "./MorvaneLogs/Morvane.log";
     bool json = false;
-    std::string page; // the file of --html; empty: none
+    std::string page;    // the file of --html; empty: none
+    std::string metrics; // the file of --prometheus; likewise
     std::vector<std::pair<CLI::App*, Run>> commands;
     // The words that an option or argument takes; one that has a delimiter takes a list of them.
     std::map<const CLI::Option*, std::vector<std::string>> words;
