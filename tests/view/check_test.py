@@ -9,7 +9,7 @@ import unittest
 from pathlib import Path
 
 import make_log
-from support import PROGRAM, lab_log, run
+from support import PROGRAM, ROOT, host_log, lab_log, run
 
 OK, WARNING, CRITICAL, UNKNOWN = range(4)
 HEALTHY = make_log.healthy().bytes()
@@ -281,6 +281,20 @@ class Runners(Check):
             self.assertEqual((turned.returncode, turned.stdout.decode().split("\n")[0]),
                              ({"WARNING": 1, "CRITICAL": 2, "OK": 0}[to],
                               plain.stdout.decode().split("\n")[0].replace(f"MORVANE {state}", f"MORVANE {to}")))
+
+
+class Documentation(Check):
+    def test_shows_the_line_of_a_path_that_is_lost(self):
+        demo = host_log("demo")
+        lost = re.sub(rb"\|  \|  \|  \|_ lun name /dev/sdp .*\n", b"", demo)
+        trace = lost.index(b"Added to DevMap", lost.rindex(b"Added to DevMap", 0, lost.index(b"--> /dev/sdp -->")))
+        lost = lost[:trace] + lost[lost.index(b"Added to DevMap", trace + 1):]
+        (self.folder / "accepted.log").write_bytes(demo)
+        (self.folder / "MorvaneLogs").mkdir()
+        (self.folder / "MorvaneLogs" / "Morvane.log").write_bytes(lost)
+        page = (ROOT / "docs" / "monitoring.md").read_text()
+        shown = re.search(r"^\$ morvane-view (check .*)\n(.*)\n", page, re.M)
+        self.assertEqual(self.checked(*shown[1].split()[1:])[:2], (WARNING, shown[2]))
 
 
 class Laboratory(Check):
