@@ -7,7 +7,7 @@ unpack_monitoring() {
     [ -x "$target/usr/bin/prometheus-node-exporter" ] && return
     mkdir -p "$target" "$download"
     as_root apt-get update -qq || true
-    (cd "$download" && apt-get download -qq prometheus prometheus-node-exporter)
+    (cd "$download" && apt-get -qq -o APT::Sandbox::User=root download prometheus prometheus-node-exporter)
     dpkg-deb --extract "$download"/prometheus_*.deb "$target"
     dpkg-deb --extract "$download"/prometheus-node-exporter_*.deb "$target" # the last: it marks the end
 }
