@@ -71,7 +71,8 @@ morvane_install(morvane ${CMAKE_INSTALL_SBINDIR} docs/morvane.8)
 install(FILES README.md DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane COMPONENT morvane)
 file(GLOB documents CONFIGURE_DEPENDS docs/*.md docs/*.svg)
 list(REMOVE_ITEM documents # other packages'
-  ${CMAKE_SOURCE_DIR}/docs/fleet.md ${CMAKE_SOURCE_DIR}/docs/identity.md ${CMAKE_SOURCE_DIR}/docs/watch.md)
+  ${CMAKE_SOURCE_DIR}/docs/fleet.md ${CMAKE_SOURCE_DIR}/docs/identity.md ${CMAKE_SOURCE_DIR}/docs/monitoring.md
+  ${CMAKE_SOURCE_DIR}/docs/watch.md)
 install(FILES ${documents} DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane/docs COMPONENT morvane)
 
 # Where the collectors of support bundles look for other programs' plugins. sos stands among the modules of the system's
@@ -117,7 +118,8 @@ if(TARGET morvane-view)
     DESTINATION ${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d COMPONENT morvane-view)
   install(FILES view/morvane-log.schema.json view/morvane-verify.schema.json
     DESTINATION ${CMAKE_INSTALL_DATADIR}/morvane-view COMPONENT morvane-view)
-  install(FILES docs/fleet.md docs/identity.md docs/view.png
+  install(DIRECTORY monitoring DESTINATION ${CMAKE_INSTALL_DATADIR}/morvane-view COMPONENT morvane-view)
+  install(FILES docs/fleet.md docs/identity.md docs/monitoring.md docs/view.png
     DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/morvane-view COMPONENT morvane-view)
 
   list(APPEND CPACK_COMPONENTS_ALL morvane-view)

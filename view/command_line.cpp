@@ -3,6 +3,7 @@
 #include <iostream>
 
 #include "view/commands.hpp"
+#include "view/show/escape.hpp"
 #include "view/trouble.hpp"
 
 namespace view {
@@ -16,6 +17,7 @@ constexpr const char* kExamples = R"(Examples:
   morvane-view --json Morvane.log | jq '.luns[] | select(.pathCount < 2)'
   morvane-view paths -o device,luid,map --filter 'problem=*unique*'
   morvane-view diff before.log after.log     exit status 0 same, 1 different, 2 trouble
+  morvane-view check accepted.log            for Nagios, Icinga, Checkmk: one line, status 0 to 3
   morvane-view san --html san.html logs/*/Morvane.log)";
 
 } // namespace
@@ -31,7 +33,11 @@ CommandLine::CommandLine()
     addPage(&app);
     jsonOption = app.get_option("--json");
     pageOption = app.get_option("--html");
+    metricsOption = app.add_option("--prometheus", metrics,
+                                   "write metrics to FILE, for the textfile collector of node_exporter");
+    metricsOption->type_name("FILE");
     addPaths(*this);
+    addCheck(*this);
     addDiff(*this);
     addSan(*this);
     addVerify(*this);
@@ -41,6 +47,7 @@ CommandLine::CommandLine()
 CLI::App* CommandLine::addCommand(const std::string& name, const std::string& description, Run run) {
     CLI::App* command = app.add_subcommand(name, description);
     command->excludes(logOption);
+    command->excludes(metricsOption);
     commands.emplace_back(command, std::move(run));
     return command;
 }
@@ -58,6 +65,9 @@ int runCommandLine(int argc, char** argv) {
     try {
         line.app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
+        if (error.get_exit_code() != 0 && line.app.got_subcommand("check")) {
+            return endUnknown(printable(error.what()));
+        }
         return line.app.exit(error) == 0 ? kExitSame : kExitTrouble;
     }
     for (const auto& [command, run] : line.commands) {

@@ -24,7 +24,7 @@ struct CommandLine {
 
     CommandLine();
 
-    // Adds a command. The program's own LOG is refused beside it.
+    // Adds a command. The program's own LOG and --prometheus are refused beside it.
     CLI::App* addCommand(const std::string& name, const std::string& description, Run run);
 
     // Adds --json and --html FILE; what they are given before the command's name counts as well.
@@ -32,12 +32,14 @@ struct CommandLine {
     void addPage(CLI::App* command);
 
     CLI::App app;
-    CLI::Option* logOption = nullptr;  // the program's own LOG
-    CLI::Option* jsonOption = nullptr; // the program's own --json
-    CLI::Option* pageOption = nullptr; // the program's own --html
+    CLI::Option* logOption = nullptr;     // the program's own LOG
+    CLI::Option* jsonOption = nullptr;    // the program's own --json
+    CLI::Option* pageOption = nullptr;    // the program's own --html
+    CLI::Option* metricsOption = nullptr; // the program's own --prometheus
     std::string log = "./MorvaneLogs/Morvane.log";
     bool json = false;
-    std::string page; // the file of --html; empty: none
+    std::string page;    // the file of --html; empty: none
+    std::string metrics; // the file of --prometheus; likewise
     std::vector<std::pair<CLI::App*, Run>> commands;
     // The words that an option or argument takes; one that has a delimiter takes a list of them.
     std::map<const CLI::Option*, std::vector<std::string>> words;

@@ -9,10 +9,14 @@ namespace view {
 
 int runReport(const CommandLine& line);
 
+void addCheck(CommandLine& line);
 void addDiff(CommandLine& line);
 void addPaths(CommandLine& line);
 void addSan(CommandLine& line);
 void addVerify(CommandLine& line);
 void addCompletion(CommandLine& line);
+
+// Writes, as a check does, that its state is unknown, and gives the exit status. `reason` is fit to be shown.
+int endUnknown(const std::string& reason);
 
 } // namespace view

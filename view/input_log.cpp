@@ -1,5 +1,7 @@
 #include "view/input_log.hpp"
 
+#include <sys/stat.h>
+
 #include <cerrno>
 #include <filesystem>
 #include <fstream>
@@ -61,6 +63,14 @@ Model openLog(const std::string& path) {
             path, "unpacks to thousands of times its size, which no log does; it is not read further");
     }
     throw troubleWith(path, "is not a Morvane log");
+}
+
+std::optional<std::int64_t> timeWritten(const std::string& path) {
+    struct stat facts {};
+    if (path == "-" || stat(path.c_str(), &facts) != 0) {
+        return std::nullopt;
+    }
+    return facts.st_mtime;
 }
 
 bool isLog(const std::string& path) {

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <cstdint>
+#include <optional>
 #include <string>
 
 #include "view/model/model.hpp"
@@ -10,6 +12,9 @@ namespace view {
 // or is no log of Morvane's; input that shows no sign of one is given up early, so input without an end ends
 // as well.
 Model openLog(const std::string& path);
+
+// When the file at `path` was last written, in seconds since the epoch; nothing for standard input.
+std::optional<std::int64_t> timeWritten(const std::string& path);
 
 // Whether the file at `path` begins as a log of Morvane's does. False for one that cannot be read.
 bool isLog(const std::string& path);

@@ -6,6 +6,7 @@
 #include "view/output_file.hpp"
 #include "view/show/html_page.hpp"
 #include "view/show/json.hpp"
+#include "view/show/prometheus.hpp"
 #include "view/show/text.hpp"
 
 namespace view {
@@ -19,7 +20,11 @@ int runReport(const CommandLine& line) {
     if (line.json) {
         std::cout << toJson(model).dump(2) << '\n';
     }
-    if (line.json || !line.page.empty()) {
+    if (!line.metrics.empty()) {
+        writeOutput(line.metrics, {line.log},
+                    [&](std::ostream& output) { writePrometheus(output, model, timeWritten(line.log)); });
+    }
+    if (line.json || !line.page.empty() || !line.metrics.empty()) {
         warnOf(model);
     } else {
         writeText(std::cout, model, outputStyle());

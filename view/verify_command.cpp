@@ -1,5 +1,3 @@
-#include <sys/stat.h>
-
 #include <cerrno>
 #include <filesystem>
 #include <fstream>
@@ -101,15 +99,6 @@ std::string contentOf(const std::string& path) {
     return content;
 }
 
-// When a log was written, for want of a time in it. Nothing for standard input.
-std::optional<std::int64_t> timeOf(const std::string& log) {
-    struct stat facts {};
-    if (log == "-" || stat(log.c_str(), &facts) != 0) {
-        return std::nullopt;
-    }
-    return facts.st_mtime;
-}
-
 void refuseOtherHost(const Request& request, const Model& model, const std::string& host) {
     if (!request.isForced && !model.host.empty() && !host.empty() && model.host != host) {
         throw Trouble("the log is of host " + printable(model.host) + ", but " +
@@ -131,7 +120,7 @@ Answer compared(const Request& request) {
     answer.log = logOf(request);
     answer.model = openLog(answer.log);
     if (!answer.model.time) {
-        answer.model.time = timeOf(answer.log);
+        answer.model.time = timeWritten(answer.log);
     }
     const std::string mapsFile =
         request.maps.empty() && !request.root.empty() ? recorded(request.root, kMaps) : request.maps;

@@ -2,17 +2,20 @@
 // chunks that the log comes in, which take turns (0: all there is), and then the log.
 #include <algorithm>
 #include <array>
+#include <set>
 #include <sstream>
 #include <string>
 #include <vector>
 
 #include "tests/fuzz/input.hpp"
+#include "view/model/check.hpp"
 #include "view/model/diff.hpp"
 #include "view/model/san.hpp"
 #include "view/read/log_reader.hpp"
 #include "view/show/escape.hpp"
 #include "view/show/html_page.hpp"
 #include "view/show/json.hpp"
+#include "view/show/prometheus.hpp"
 #include "view/show/text.hpp"
 
 namespace {
@@ -78,6 +81,34 @@ void checkDifference(const Model& before, const Model& after) {
     static_cast<void>(view::toJson(difference).dump()); // which throws for what is not UTF-8
 }
 
+// What programs that watch services read: the sign that begins performance data stands in the first line
+// alone, and there once, where the losses could be judged.
+void checkCheck(const Model& baseline, const Model& log) {
+    const view::Check check = view::check(baseline, log, {});
+    std::ostringstream output;
+    view::writeText(output, check);
+    const std::string text = output.str();
+    const std::size_t bar = text.find('|');
+    require((bar == std::string::npos) == check.doubt.has_value(), "performance data of what is not known");
+    require(bar == std::string::npos || (bar < text.find('\n') && bar == text.rfind('|')),
+            "a bar of the log's");
+}
+
+// Metrics, of which a file with one series twice is refused as a whole.
+void checkMetrics(const Model& report) {
+    std::ostringstream output;
+    view::writePrometheus(output, report, 0);
+    std::istringstream lines(output.str());
+    std::set<std::string> series;
+    for (std::string line; std::getline(lines, line);) {
+        require(view::printable(line).size() ==
+                    line.size() + static_cast<std::size_t>(std::count(line.begin(), line.end(), '\\')),
+                "a metric that is no line of UTF-8");
+        require(line.front() == '#' || series.insert(line.substr(0, line.rfind(' '))).second,
+                "a series twice");
+    }
+}
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8* data, std::size_t size) {
@@ -102,6 +133,10 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8* data, std::size_t size) {
     require(view::compare(report, report).isEmpty(), "a log that differs from itself");
     checkDifference(reports[1], reports[2]);
     checkDifference(reports[2], reports[1]);
+    require(view::check(report, report, {}).lostPaths == 0, "a loss without a difference");
+    checkCheck(report, report);
+    checkCheck(report, reports[1]);
+    checkMetrics(report);
 
     const view::San san = view::join(reports);
     checkText(san);

@@ -359,8 +359,9 @@ def fc_lun(device, identifier, lun, port, **more):
             "vendor": "ACME", "product": "ARRAY 9", **more}
 
 
-def healthy(host="hosta", first_disk=1):
-    """Two adapters, two targets each, three LUNs over four paths; one iSCSI session; a disk of its own."""
+def healthy(host="hosta", first_disk=1, without=()):
+    """Two adapters, two targets each, three LUNs over four paths; one iSCSI session; a disk of its own. `without`: paths that
+    are not there, each as the numbers of adapter, target and LUN."""
     log = Log(host)
     log.multipath()
     disk = first_disk
@@ -369,8 +370,9 @@ def healthy(host="hosta", first_disk=1):
         luns = []
         for target in range(2):
             for lun in range(3):
-                luns.append(fc_lun(disk_name(disk), f"600A0B80000000000000000000000{lun:03d}", lun,
-                                   wwn(0x52, 16 * a + target)))
+                if (a, target, lun) not in without:
+                    luns.append(fc_lun(disk_name(disk), f"600A0B80000000000000000000000{lun:03d}", lun,
+                                       wwn(0x52, 16 * a + target)))
                 disk += 1
         adapters.append({"name": f"acme-a8-{a}", "wwnn": wwn(0x20, a), "ports": [wwn(0x10, a)], "luns": luns})
     log.fc(adapters)

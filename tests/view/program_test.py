@@ -244,6 +244,13 @@ class Diff(unittest.TestCase):
         self.assertEqual(document["warnings"], [
             "the new log's ISCSI tree was ended early: what it does not list counts as lost"])
 
+    def test_a_log_without_its_beginning_or_its_end_is_said(self):
+        log = make_log.healthy().bytes()
+        warning = " is not whole: what it does not reach counts as lost"
+        for cut in (log[200:], log[:-200]):
+            self.assertIn("the old log" + warning, self.compare(cut, log)[1]["warnings"])
+            self.assertIn("the new log" + warning, self.compare(log, cut)[1]["warnings"])
+
     def test_two_hosts_are_told_apart_by_name_or_by_initiators(self):
         one, other = make_log.healthy("one").bytes(), make_log.healthy("other").bytes()
         self.assertEqual(self.compare(one, other)[1]["warnings"], ["the logs are of two hosts: one and other"])

@@ -308,6 +308,41 @@ class Runs(WatchTest):
         self.assertEqual(len(self.names()), 41)
 
 
+class Metrics(WatchTest):
+    def setUp(self):
+        super().setUp()
+        self.file = self.folder / "morvane.prom"
+        (self.folder / "watch.conf").write_text(f"metrics = {self.file}\n")
+
+    def value(self, name):
+        return re.search(f"^{name} (.*)$", self.file.read_text(), re.M)[1]
+
+    def test_are_those_of_the_log_and_for_all_to_read(self):
+        self.morvane(HEALTHY)
+        mask = os.umask(0o077)  # the service's
+        self.addCleanup(os.umask, mask)
+        self.assertEqual(self.watch("run")[0], NO_BASELINE)
+        self.assertEqual(self.file.stat().st_mode & 0o777, 0o644)
+        self.assertEqual((self.value("morvane_luns"), self.value("morvane_run_complete")), ("4", "1"))
+        archive = self.history / self.names()[0]
+        self.assertEqual(archive.stat().st_mode & 0o777, 0o600)
+        done = subprocess.run([self.programs / "morvane-view", "--prometheus", "-", archive], capture_output=True, check=True)
+        self.assertEqual(self.file.read_bytes(), done.stdout)
+
+    def test_of_a_log_that_is_not_whole_say_so(self):
+        self.morvane(HEALTHY[:-200])
+        self.assertEqual(self.watch("run"), (TROUBLE, "the log is not whole: it is cut off\n", ""))
+        self.assertEqual(self.value("morvane_run_complete"), "0")
+
+    def test_that_cannot_be_written_cost_no_log(self):
+        (self.folder / "watch.conf").write_text("metrics = /nonexistent/morvane.prom\n")
+        self.morvane(HEALTHY)
+        self.assertEqual(self.watch_at(NIGHT, "run"), (
+            TROUBLE, "morvane-view: /nonexistent/morvane.prom: No such file or directory\n"
+                     "no baseline: accept one with `morvane-watch accept`\n"))
+        self.assertEqual(self.names(), ["20151121T020000Z.log.zst"])
+
+
 class BadState(WatchTest):
     """A history in which something is wrong."""
 
@@ -446,22 +481,26 @@ class Settings(WatchTest):
     def read(self, text):
         (self.folder / "watch.conf").write_bytes(text)
         read = settings.read(str(self.folder / "watch.conf"))
-        return (read.keep, read.weeks, read.timeout), [trouble.replace(f"{self.folder}/", "") for trouble in read.troubles]
+        return (read.keep, read.weeks, read.timeout, read.metrics), [trouble.replace(f"{self.folder}/", "") for trouble in read.troubles]
 
     def test_need_no_file_and_the_one_that_is_installed_changes_none(self):
         missing = settings.read(str(self.folder / "none"))
-        self.assertEqual(((missing.keep, missing.weeks, missing.timeout), missing.troubles), ((30, 52, 3600), []))
+        self.assertEqual(((missing.keep, missing.weeks, missing.timeout, missing.metrics), missing.troubles),
+                         ((30, 52, 3600, None), []))
         text = (WATCH / "watch.conf").read_bytes()
-        self.assertEqual(self.read(text), ((30, 52, 3600), []))
-        self.assertEqual(self.read(re.sub(rb"^#(\w+ = )", rb"\1", text, flags=re.M)), ((30, 52, 3600), []))
-        self.assertEqual(re.findall(rb"^#(\w+) = ", text, re.M), [b"keep", b"weeks", b"timeout"])
+        self.assertEqual(self.read(text), ((30, 52, 3600, None), []))
+        self.assertEqual(self.read(re.sub(rb"^#(\w+ = )", rb"\1", text, flags=re.M)),
+                         ((30, 52, 3600, "/var/lib/prometheus/node-exporter/morvane.prom"), []))
+        self.assertEqual(re.findall(rb"^#(\w+) = ", text, re.M), [b"keep", b"weeks", b"timeout", b"metrics"])
 
     def test_are_taken_from_the_file(self):
-        self.assertEqual(self.read(b"keep=1 # few\n\n  weeks = 0\n# timeout = 2\ntimeout = 7200"), ((1, 0, 7200), []))
+        self.assertEqual(self.read(b"keep=1 # few\n\n  weeks = 0\n# timeout = 2\ntimeout = 7200\nmetrics = /x y/z.prom"),
+                         ((1, 0, 7200, "/x y/z.prom"), []))
 
     def test_that_are_wrong_are_named_and_have_their_defaults(self):
         self.assertEqual(self.read(b"keep = 0\nweeks = -1\ntimeout = 7201\nkepp = 3\nkeep\n = 4\n\xff = \x1b\nkeep = 10000000000\n"
-                                   b"weeks = \xd9\xa3\n"), ((30, 52, 3600), [
+                                   b"weeks = \xd9\xa3\nmetrics = x.prom\nmetrics = /x/.prom\nmetrics = /x/y.txt\nmetrics =\n"),
+                         ((30, 52, 3600, None), [
             "watch.conf, line 1: keep is no whole number from 1 to 100000: 0",
             "watch.conf, line 2: weeks is no whole number from 0 to 5200: -1",
             "watch.conf, line 3: timeout is no whole number from 1 to 7200: 7201",
@@ -471,6 +510,10 @@ class Settings(WatchTest):
             "watch.conf, line 7: there is no setting \\xFF",
             "watch.conf, line 8: keep is no whole number from 1 to 100000: 10000000000",
             "watch.conf, line 9: weeks is no whole number from 0 to 5200: ٣",
+            "watch.conf, line 10: metrics is no path from / to a file NAME.prom: x.prom",
+            "watch.conf, line 11: metrics is no path from / to a file NAME.prom: /x/.prom",
+            "watch.conf, line 12: metrics is no path from / to a file NAME.prom: /x/y.txt",
+            "watch.conf, line 13: metrics is no path from / to a file NAME.prom: ",
         ]))
 
     def test_that_cannot_be_read_are_told(self):

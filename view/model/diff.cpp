@@ -280,7 +280,7 @@ void addWarnings(Difference& difference, const Model& model, bool isOfNewLog) {
     const auto warn = [&](DiffWarning::Kind kind, Tree tree = Tree::Run, std::uint64_t pieces = 0) {
         difference.warnings.push_back({kind, isOfNewLog, tree, pieces});
     };
-    if (!model.log.complete) {
+    if (!model.log.complete || model.log.beginsInside) {
         warn(DiffWarning::Kind::NotWhole);
     }
     for (const auto& [tree, state] :
@@ -301,6 +301,12 @@ bool Difference::isEmpty() const {
     return identityChanges.empty() && lostPaths.empty() && newPaths.empty() && pathCounts.empty() &&
            lostDirect.empty() && newDirect.empty() && lostLogical.empty() && newLogical.empty() &&
            !powerPathBefore;
+}
+
+std::size_t Difference::dangerousChanges() const {
+    return static_cast<std::size_t>(
+        std::count_if(identityChanges.begin(), identityChanges.end(),
+                      [](const IdentityChange& change) { return change.isDangerous(); }));
 }
 
 Difference compare(const Model& before, const Model& after) {

@@ -67,6 +67,9 @@ struct Difference {
     std::optional<PowerPathState> powerPathAfter;
 
     [[nodiscard]] bool isEmpty() const;
+
+    // The number of paths to another LUN than before.
+    [[nodiscard]] std::size_t dangerousChanges() const;
 };
 
 Difference compare(const Model& before, const Model& after);

@@ -45,6 +45,7 @@ enum class ProblemKind : unsigned char {
     NamesDiffer,
     ForeignText,
 };
+inline constexpr ProblemKind kLastProblemKind = ProblemKind::ForeignText;
 
 struct Problem {
     Severity severity = Severity::Problem;

@@ -21,10 +21,9 @@ void writeCountedHeading(std::ostream& output, const Style& style, std::string_v
     writeHeading(output, style, std::string(heading) + " (" + std::to_string(count) + ")");
 }
 
-void writeIdentityChanges(std::ostream& output, const Style& style,
-                          const std::vector<IdentityChange>& changes) {
-    const auto dangerous = static_cast<std::size_t>(std::count_if(
-        changes.begin(), changes.end(), [](const IdentityChange& change) { return change.isDangerous(); }));
+void writeIdentityChanges(std::ostream& output, const Style& style, const Difference& difference) {
+    const std::vector<IdentityChange>& changes = difference.identityChanges;
+    const std::size_t dangerous = difference.dangerousChanges();
     if (dangerous > 0) {
         output << '\n'
                << style.problem << "DANGER: another LUN behind the same initiator, target and LUN number ("
@@ -106,7 +105,7 @@ void writeText(std::ostream& output, const Difference& difference, const Style& 
         output << style.good << "No difference." << style.end << '\n';
         return;
     }
-    writeIdentityChanges(output, style, difference.identityChanges);
+    writeIdentityChanges(output, style, difference);
     writePaths(output, style, "Lost paths", difference.lostPaths,
                "the new log identified such a device without listing it");
     writePaths(output, style, "New paths", difference.newPaths,

@@ -1,6 +1,7 @@
-"""What morvane-view says of logs: whether one is whole, and how two differ."""
+"""What morvane-view says of logs: whether one is whole, how two differ, what it comes to as metrics."""
 
 import json
+import os
 import subprocess
 
 from . import journal
@@ -122,6 +123,16 @@ def is_whole(log):
     """Whether the log at the path reaches from a run's beginning to its end. Raises Trouble if it cannot be read."""
     return understood(lambda report: report["log"]["complete"] and not report["log"]["beginsInside"],
                       ["--json", log], (0,))
+
+
+def write_metrics(path, log):
+    """Has the metrics of the log written to the file at path, which all may read unless it is there already. Raises Trouble
+    if they cannot be."""
+    mask = os.umask(0o022)
+    try:
+        asked(["--prometheus", path, log], (0,))
+    finally:
+        os.umask(mask)
 
 
 def compare(old, new):

@@ -75,6 +75,9 @@ class Run:
             log = self.archive.path
         except Trouble as trouble:
             self._trouble("%s; the log stays in %s" % (trouble, log))
+        if self.settings.metrics is not None:
+            with self._told():
+                differences.write_metrics(self.settings.metrics, log)
         if failure:
             self._trouble("the log is not whole: " + failure)
         else:

@@ -6,7 +6,7 @@ from .trouble import printable, told
 
 MOST_BYTES = 4096
 
-# Each setting with its default, the least and the most it may be.
+# Each whole number with its default, the least and the most it may be.
 KNOWN = {
     "keep": (30, 1, 100000),  # the newest logs, so many
     "weeks": (52, 0, 5200),  # one log of each of so many weeks
@@ -15,15 +15,21 @@ KNOWN = {
 
 
 class Settings:
-    """keep, weeks and timeout as whole numbers, and troubles: what is wrong in the file, a text each. A setting that
-    is wrong has its default."""
+    """keep, weeks and timeout as whole numbers; metrics, the path of a file or None; and troubles: what is wrong in the
+    file, a text each. A setting that is wrong has its default."""
 
     def __init__(self):
         self.troubles = []
         self.keep, self.weeks, self.timeout = (default for default, _, _ in KNOWN.values())
+        self.metrics = None
 
     def take(self, name, value):
         """Sets one setting from the file's texts; gives what is wrong with it, or None."""
+        if name == "metrics":
+            if not re.fullmatch(r"/.*[^/]\.prom", value):
+                return "metrics is no path from / to a file NAME.prom: %s" % printable(value)
+            self.metrics = value
+            return None
         if name not in KNOWN:
             return "there is no setting %s" % (printable(name) or "without a name")
         _, least, most = KNOWN[name]
