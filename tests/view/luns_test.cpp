@@ -1,5 +1,7 @@
 #include "view/model/luns.hpp"
 
+#include <cstdint>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -114,6 +116,37 @@ TEST(Luns, AreUniqueWithOneNumberAtEachTarget) {
     const Model model = modelOf(kFcBanner + adapterLines("1") + pathLines("52:01", "/dev/sda", "6", "0") +
                                 pathLines("52:02", "/dev/sdb", "6", "1"));
     EXPECT_EQ(reasonsOf(model), Lines{""});
+}
+
+// A page 83h with one NAA designator that ends in `last`.
+view::Page83 pageOf(std::uint8_t last) {
+    return std::make_shared<const std::vector<std::uint8_t>>(
+        std::vector<std::uint8_t>{0, 0x83, 0, 12, 1, 3, 0, 8, 0x50, 0, 0xc5, 0, 0, 0, 0, last});
+}
+
+TEST(Luns, AreAProblemWhereOtherProgramsNameTheirPathsDifferently) {
+    Model model;
+    const view::Identifier identifier = {"6", view::IdentifierKind::Naa};
+    model.direct.devices = {{"/dev/sda", identifier, pageOf(1)},
+                            {"/dev/sdb", identifier, pageOf(1)},
+                            {"/dev/sdc", identifier, pageOf(2)},
+                            {"/dev/sdd", identifier, pageOf(3)}};
+    view::groupLuns(model);
+    EXPECT_EQ(
+        sectionOf(model, "problems"),
+        R"([{"severity":"problem","kind":"names-differ","tree":"run","subject":"6",)"
+        R"("cause":"/dev/sdc answers with other designators than /dev/sda: to multipath, the kernel or )"
+        R"(udev they are two LUNs","line":null}])");
+}
+
+TEST(Luns, AreNoProblemWhereTheirPathsAnswerAlikeOrNotAtAll) {
+    Model model;
+    const view::Identifier identifier = {"6", view::IdentifierKind::Naa};
+    model.direct.devices = {{"/dev/sda", identifier, nullptr},
+                            {"/dev/sdb", identifier, pageOf(1)},
+                            {"/dev/sdc", identifier, pageOf(1)}};
+    view::groupLuns(model);
+    EXPECT_EQ(sectionOf(model, "problems"), "[]");
 }
 
 TEST(Luns, PutProblemsBeforeNotes) {
