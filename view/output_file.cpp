@@ -1,5 +1,6 @@
 #include "view/output_file.hpp"
 
+#include <ext/stdio_filebuf.h>
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -32,12 +33,21 @@ void refuseToSpoil(const std::string& path, const std::vector<std::string>& inpu
     }
 }
 
-void writeTo(std::ofstream& file, const std::string& path, const std::function<void(std::ostream&)>& write) {
-    if (file) {
-        write(file);
-        file.close();
+// A link that somebody else put there could lead to any file: it is no way to one of the caller's.
+void refuseOthersLink(const std::string& path) {
+    struct stat entry {};
+    if (lstat(path.c_str(), &entry) == 0 && S_ISLNK(entry.st_mode) && entry.st_uid != geteuid() &&
+        entry.st_uid != 0) {
+        throw troubleWith(path, "is a link of another user; name the file that it leads to");
     }
-    if (!file) {
+}
+
+void writeTo(std::filebuf& buffer, const std::string& path, const std::function<void(std::ostream&)>& write) {
+    std::ostream file(&buffer);
+    if (buffer.is_open()) {
+        write(file);
+    }
+    if (!file || buffer.close() == nullptr) {
         throw systemTrouble(path);
     }
 }
@@ -45,18 +55,14 @@ void writeTo(std::ofstream& file, const std::string& path, const std::function<v
 // A file of its own name beside `path`, gone at the end unless it was put in its place.
 class FileBeside {
 public:
-    explicit FileBeside(const std::string& path) : mPath(path), mName(path + ".XXXXXX") {
-        const int fd = mkstemp(mName.data());
-        if (fd < 0) {
-            throw systemTrouble(path);
-        }
+    explicit FileBeside(const std::string& path)
+        : mPath(path), mName(path + ".XXXXXX"), mBuffer(created(), std::ios::out | std::ios::binary) {
         const mode_t mask = umask(0);
         umask(mask);
         struct stat old {};
         const mode_t mode = stat(path.c_str(), &old) == 0 ? old.st_mode & 0777U : 0666U & ~mask;
-        const bool isUsable = fchmod(fd, mode) == 0;
-        close(fd);
-        if (!isUsable) {
+        if (fchmod(mBuffer.fd(), mode) != 0) {
+            unlink(mName.c_str());
             throw systemTrouble(path);
         }
     }
@@ -68,7 +74,8 @@ public:
         }
     }
 
-    [[nodiscard]] const std::string& name() const { return mName; }
+    // Writes to the file that was created, whatever others have put under its name since.
+    [[nodiscard]] std::filebuf& buffer() { return mBuffer; }
 
     void takePlace() {
         if (std::rename(mName.c_str(), mPath.c_str()) != 0) {
@@ -78,8 +85,17 @@ public:
     }
 
 private:
+    int created() {
+        const int file = mkstemp(mName.data());
+        if (file < 0) {
+            throw systemTrouble(mPath);
+        }
+        return file;
+    }
+
     std::string mPath;
     std::string mName;
+    __gnu_cxx::stdio_filebuf<char> mBuffer;
 };
 
 } // namespace
@@ -90,12 +106,14 @@ void writeOutput(const std::string& path, const std::vector<std::string>& inputs
         write(std::cout);
         return;
     }
+    refuseOthersLink(path);
     std::error_code ignored;
     const fs::file_status place = fs::status(path, ignored); // of what a link leads to
     if (fs::exists(place) && !fs::is_regular_file(place)) {
         errno = 0;
-        std::ofstream file(path, std::ios::binary);
-        writeTo(file, path, write);
+        std::filebuf buffer;
+        buffer.open(path, std::ios::out | std::ios::binary);
+        writeTo(buffer, path, write);
         return;
     }
     refuseToSpoil(path, inputs);
@@ -104,8 +122,7 @@ void writeOutput(const std::string& path, const std::vector<std::string>& inputs
         fs::is_symlink(fs::symlink_status(path, ignored)) ? fs::weakly_canonical(path) : fs::path(path);
     FileBeside beside(target.string());
     errno = 0;
-    std::ofstream file(beside.name(), std::ios::binary);
-    writeTo(file, path, write);
+    writeTo(beside.buffer(), path, write);
     beside.takePlace();
 }
 

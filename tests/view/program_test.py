@@ -336,6 +336,21 @@ class Evidence(unittest.TestCase):
                      "MorvaneLogs/Morvane.log")
         self.assertEqual(other.read_bytes(), self.log)
 
+    def test_nothing_is_written_where_a_link_of_another_user_leads(self):
+        target = self.folder / "another file"
+        target.write_text("its text")
+        (self.folder / "link").symlink_to(target)
+        self.assertEqual(run("--html", "link", folder=self.folder).returncode, 0)  # one's own is a way like any other
+        self.assertTrue((self.folder / "link").is_symlink())
+        self.assertTrue(target.read_text().endswith("</html>\n"))
+        if os.geteuid() != 0:
+            self.skipTest("only root can give a link away")
+        os.chown(self.folder / "link", 65534, 65534, follow_symlinks=False)
+        target.write_text("its text")
+        for option in ("--html", "--prometheus"):
+            self.refused("link: is a link of another user; name the file that it leads to", option, "link")
+            self.assertEqual(target.read_text(), "its text")
+
     def test_a_page_replaces_an_older_one_whole_or_not_at_all(self):
         page = self.folder / "page.html"
         page.write_text("an older page")
