@@ -3,18 +3,19 @@
 
 lint_packages=(clang-format clang-tidy shellcheck pyflakes3 man-db groff-base)
 
-# The C++ sources of the project, one a line.
+# sources [FOLDER...]: the C++ sources of the project, or of the folders alone, one a line.
 sources() {
-    git ls-files --cached --others --exclude-standard '*.cpp' '*.hpp'
+    git ls-files --cached --others --exclude-standard -- "$@" | grep -E '\.[ch]pp$'
 }
 
+# cmd_lint [FOLDER...]: clang-tidy reads the sources in the folders alone; all else is looked at whole.
 cmd_lint() {
     need "${run_packages[@]}" "${test_packages[@]}" "${lint_packages[@]}"
     # What GoogleTest's precompiled headers bring beyond what a test includes would be read with each.
     cmake --preset debug -B build/lint -DMORVANE_TESTS=ON -DCMAKE_DISABLE_PRECOMPILE_HEADERS=ON >/dev/null
     cmake --build build/lint -- --quiet view/view/show/page_template.hpp # a source includes it
     sources | xargs clang-format --dry-run --Werror
-    sources | grep '\.cpp$' | xargs -P "$(nproc)" -n 4 clang-tidy --quiet -p build/lint 2>/dev/null
+    sources "$@" | grep '\.cpp$' | xargs -P "$(nproc)" -n 4 clang-tidy --quiet -p build/lint 2>/dev/null
     shellcheck -x -a dev # with all it sources
     shellcheck .ci/run tests/hardening/check.sh tests/packages/install_and_run
     shellcheck watch/morvane-watch.bash support/supportconfig packaging/debian/*/p* packaging/rpm/*/p*
