@@ -5,6 +5,7 @@
 #include <sstream>
 #include <string>
 
+#include "view/command_line.hpp"
 #include "view/commands.hpp"
 #include "view/input_log.hpp"
 #include "view/model/check.hpp"

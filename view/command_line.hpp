@@ -10,11 +10,6 @@
 
 namespace view {
 
-// What the program ends with. Differences and findings are those of diff and verify.
-constexpr int kExitSame = 0;
-constexpr int kExitDifferent = 1;
-constexpr int kExitTrouble = 2;
-
 // The command line of morvane-view: the one place where help, what is accepted and what shells complete come
 // from. Each command has a file of its own, whose function adds it. What an option or argument takes is told
 // by its type name: FILE and DIR are names of files, and are completed as such.
@@ -44,8 +39,5 @@ struct CommandLine {
     // The words that an option or argument takes; one that has a delimiter takes a list of them.
     std::map<const CLI::Option*, std::vector<std::string>> words;
 };
-
-// Parses the arguments and runs what they ask for. Gives the program's exit status; throws Trouble.
-int runCommandLine(int argc, char** argv);
 
 } // namespace view

@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include "view/command_line.hpp"
+
 namespace view {
 
 namespace {

@@ -4,9 +4,9 @@
 #include <string>
 #include <vector>
 
-#include "view/command_line.hpp"
-
 namespace view {
+
+struct CommandLine;
 
 // An option or an argument, as a shell completes it.
 struct CompletedValue {

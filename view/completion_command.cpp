@@ -2,6 +2,7 @@
 #include <memory>
 #include <string>
 
+#include "view/command_line.hpp"
 #include "view/commands.hpp"
 #include "view/completion.hpp"
 

@@ -2,6 +2,7 @@
 #include <memory>
 #include <string>
 
+#include "view/command_line.hpp"
 #include "view/command_output.hpp"
 #include "view/commands.hpp"
 #include "view/input_log.hpp"

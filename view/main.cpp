@@ -1,7 +1,7 @@
 #include <exception>
 #include <iostream>
 
-#include "view/command_line.hpp"
+#include "view/commands.hpp"
 #include "view/trouble.hpp"
 
 int main(int argc, char** argv) {

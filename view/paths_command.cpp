@@ -6,6 +6,7 @@
 #include <string_view>
 #include <vector>
 
+#include "view/command_line.hpp"
 #include "view/command_output.hpp"
 #include "view/commands.hpp"
 #include "view/input_log.hpp"

@@ -1,5 +1,6 @@
 #include <iostream>
 
+#include "view/command_line.hpp"
 #include "view/command_output.hpp"
 #include "view/commands.hpp"
 #include "view/input_log.hpp"

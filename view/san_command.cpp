@@ -5,6 +5,7 @@
 #include <utility>
 #include <vector>
 
+#include "view/command_line.hpp"
 #include "view/command_output.hpp"
 #include "view/commands.hpp"
 #include "view/input_log.hpp"

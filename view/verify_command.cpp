@@ -8,6 +8,7 @@
 #include <string>
 #include <vector>
 
+#include "view/command_line.hpp"
 #include "view/command_output.hpp"
 #include "view/commands.hpp"
 #include "view/input_log.hpp"
