@@ -6,7 +6,7 @@ namespace view {
 
 namespace {
 
-// A text in a specification of _arguments or _describe, in single quotes.
+// A text in what _arguments and _describe take, in single quotes.
 std::string escaped(std::string_view text) {
     std::string shown;
     for (const char c : text) {
